@@ -1,0 +1,58 @@
+#include "com/ErrorBoundary.h"
+
+#include "com/BstrConversion.h"
+#include "com/ComError.h"
+#include "com/ComPtr.h"
+#include "com/UniqueHandles.h"
+#include "framework/LanguageStrings.h"
+
+namespace sm {
+
+HRESULT SetComErrorInfo(REFCLSID classId, std::int32_t code, std::string_view description) {
+    ComPtr<ICreateErrorInfo> creator;
+    HRESULT created = ::CreateErrorInfo(creator.Put());
+    if (FAILED(created)) return created;
+    creator->SetGUID(classId);
+    if (!description.empty()) {
+        // The message is system-ANSI text, as the client's error dialogs expect.
+        UniqueBstr text(AnsiToBstr(description));
+        creator->SetDescription(text.Get());
+    }
+    creator->SetHelpContext(0);
+    creator->SetHelpFile(nullptr);
+    ComPtr<IErrorInfo> info;
+    HRESULT queried = creator->QueryInterface(IID_IErrorInfo, info.PutVoid());
+    if (FAILED(queried)) return queried;
+    ::SetErrorInfo(0, info.Get());
+    return static_cast<HRESULT>(code);
+}
+
+HRESULT ReportTEException(REFCLSID classId, const TEException& exception) {
+    return SetComErrorInfo(classId, exception.GetErrorCode(), exception.GetDescription());
+}
+
+HRESULT TranslateCurrentException(REFCLSID classId) noexcept {
+    try {
+        try {
+            throw;
+        } catch (const TEException& exception) {
+            return ReportTEException(classId, exception);
+        } catch (const ComError& error) {
+            ::SetErrorInfo(0, error.ErrorInfo());
+            return error.Error();
+        } catch (...) {
+            return SetComErrorInfo(classId, TE_OPERATION_FAILED, GetTEErrorMessage(TE_OPERATION_FAILED));
+        }
+    } catch (...) {
+        // Reporting itself failed (no memory for the message): the code alone must still get out.
+        return static_cast<HRESULT>(TE_OPERATION_FAILED);
+    }
+}
+
+void ThrowComError(HRESULT code) {
+    ComPtr<IErrorInfo> info;
+    if (::GetErrorInfo(0, info.Put()) != S_OK) info.Reset();
+    throw ComError(code, std::move(info));
+}
+
+}  // namespace sm

@@ -1,0 +1,78 @@
+#include "MultiByte.h"
+
+#include "CodePage.h"
+
+namespace sm::multibyte {
+
+std::size_t CharBytes(std::string_view text, std::size_t offset) {
+    if (offset >= text.size()) return 0;
+    if (IsLeadByte(static_cast<unsigned char>(text[offset])) && offset + 1 < text.size()) return 2;
+    return 1;
+}
+
+std::size_t CharCount(std::string_view text) {
+    std::size_t count = 0;
+    for (std::size_t offset = 0; offset < text.size(); offset += CharBytes(text, offset)) ++count;
+    return count;
+}
+
+std::size_t ByteOffset(std::string_view text, std::size_t charPosition) {
+    std::size_t offset = 0;
+    for (std::size_t i = 0; i < charPosition && offset < text.size(); ++i) offset += CharBytes(text, offset);
+    return offset;
+}
+
+std::size_t BytesOfChars(std::string_view text, std::size_t charCount) { return ByteOffset(text, charCount); }
+
+std::size_t WholeCharPrefix(std::string_view text, std::size_t maxBytes) {
+    std::size_t offset = 0;
+    while (offset < text.size()) {
+        std::size_t next = offset + CharBytes(text, offset);
+        if (next > maxBytes) break;
+        offset = next;
+    }
+    return offset;
+}
+
+namespace {
+unsigned CharCode(std::string_view text, std::size_t offset, std::size_t bytes, bool ignoreCase) {
+    auto first = static_cast<unsigned char>(text[offset]);
+    if (bytes == 2) return (static_cast<unsigned>(first) << 8) | static_cast<unsigned char>(text[offset + 1]);
+    return ignoreCase ? LowerSingleByte(first) : first;
+}
+}  // namespace
+
+int Compare(std::string_view left, std::string_view right, bool ignoreCase) {
+    std::size_t l = 0, r = 0;
+    while (l < left.size() && r < right.size()) {
+        std::size_t lb = CharBytes(left, l), rb = CharBytes(right, r);
+        unsigned lc = CharCode(left, l, lb, ignoreCase), rc = CharCode(right, r, rb, ignoreCase);
+        if (lc != rc) return lc < rc ? -1 : 1;
+        l += lb;
+        r += rb;
+    }
+    if (l < left.size()) return 1;
+    if (r < right.size()) return -1;
+    return 0;
+}
+
+std::string ToLower(std::string_view text) {
+    std::string lowered(text);
+    for (std::size_t offset = 0; offset < lowered.size();) {
+        std::size_t bytes = CharBytes(lowered, offset);
+        if (bytes == 1) lowered[offset] = static_cast<char>(LowerSingleByte(static_cast<unsigned char>(lowered[offset])));
+        offset += bytes;
+    }
+    return lowered;
+}
+
+std::size_t FindBytes(std::string_view text, std::string_view pattern, std::size_t startByte) {
+    for (std::size_t offset = startByte; offset <= text.size(); offset += CharBytes(text, offset)) {
+        if (text.size() - offset < pattern.size()) break;
+        if (text.compare(offset, pattern.size(), pattern) == 0) return offset;
+        if (offset == text.size()) break;
+    }
+    return std::string_view::npos;
+}
+
+}  // namespace sm::multibyte

@@ -1,0 +1,89 @@
+// The error boundary: what a client sees as HRESULT and error info for each kind of failure.
+#include <gtest/gtest.h>
+
+#include <stdexcept>
+
+#include "com/ComError.h"
+#include "com/ErrorBoundary.h"
+#include "ComTestSupport.h"
+
+using namespace sm;
+using sm::testing::TakeErrorInfo;
+
+namespace {
+const ::testing::Environment* const apartment =
+    ::testing::AddGlobalTestEnvironment(new sm::testing::MultithreadedApartment);
+
+// An arbitrary class identity standing for "the class that caught it".
+const CLSID testClass = {0x7D4A10B1, 0x2C88, 0x4E21, {0xB3, 0xF6, 0x91, 0xE5, 0xA0, 0x7D, 0x2C, 0x3B}};
+}  // namespace
+
+TEST(ErrorBoundary, TECodeBecomesTheHResultWithMessageAndClass) {
+    ::SetErrorInfo(0, nullptr);
+    HRESULT result = ComBoundary(testClass, [] { TE_RAISE(TE_OPERATION_TIMED_OUT, "SessionBase::base_LockSession"); });
+    EXPECT_EQ(static_cast<unsigned long>(result), 0xFFFFBC06ul);
+    auto reported = TakeErrorInfo();
+    ASSERT_TRUE(reported.present);
+    EXPECT_EQ(reported.description, "Operation Timed Out.");
+    EXPECT_TRUE(IsEqualGUID(reported.guid, testClass));
+}
+
+TEST(ErrorBoundary, FormattedMessagesArriveWhole) {
+    HRESULT result = ComBoundary(testClass, [] {
+        DynamicString message("'%1' is not a driver session name");
+        message.ReplaceArg(1, "VXIPNP::DMM1");
+        TE_RAISE(TE_UNRECOGNIZED_VALUE, "CInstrSessionMgr::GetInstrSession", message);
+    });
+    EXPECT_EQ(static_cast<unsigned long>(result), 0xFFFFBC68ul);
+    EXPECT_EQ(TakeErrorInfo().description, "'VXIPNP::DMM1' is not a driver session name");
+}
+
+TEST(ErrorBoundary, ComErrorPassesWithItsOwnInfo) {
+    HRESULT result = ComBoundary(testClass, [] {
+        SetComErrorInfo(GUID_NULL, -1, "from inside");
+        ThrowComError(E_NOINTERFACE);
+    });
+    EXPECT_EQ(result, E_NOINTERFACE);
+    auto reported = TakeErrorInfo();
+    ASSERT_TRUE(reported.present);
+    EXPECT_EQ(reported.description, "from inside");
+    EXPECT_TRUE(IsEqualGUID(reported.guid, GUID_NULL));
+}
+
+TEST(ErrorBoundary, AnythingElseIsOperationFailed) {
+    HRESULT result = ComBoundary(testClass, [] { throw std::runtime_error("not ours"); });
+    EXPECT_EQ(static_cast<unsigned long>(result), 0xFFFFBBA4ul);
+    auto reported = TakeErrorInfo();
+    EXPECT_EQ(reported.description, "Operation Failed.");
+    EXPECT_TRUE(IsEqualGUID(reported.guid, testClass));
+}
+
+TEST(ErrorBoundary, SuccessAndExplicitResultsPassThrough) {
+    EXPECT_EQ(ComBoundary(testClass, [] {}), S_OK);
+    EXPECT_EQ(ComBoundary(testClass, []() -> HRESULT { return S_FALSE; }), S_FALSE);
+}
+
+TEST(ErrorBoundary, EmptyDescriptionSetsNoText) {
+    HRESULT result = SetComErrorInfo(testClass, -5, "");
+    EXPECT_EQ(result, static_cast<HRESULT>(-5));
+    auto reported = TakeErrorInfo();
+    ASSERT_TRUE(reported.present);
+    EXPECT_EQ(reported.description, "");
+}
+
+TEST(ErrorBoundary, ErrorInfoIsPerThread) {
+    SetComErrorInfo(testClass, TE_OPERATION_FAILED, "main thread");
+    HANDLE worker = ::CreateThread(
+        nullptr, 0,
+        [](void*) -> DWORD {
+            ::CoInitializeEx(nullptr, COINIT_MULTITHREADED);
+            SetComErrorInfo(testClass, TE_PROGRAM_ERROR, "worker thread");
+            ::CoUninitialize();
+            return 0;
+        },
+        nullptr, 0, nullptr);
+    ASSERT_NE(worker, nullptr);
+    ::WaitForSingleObject(worker, INFINITE);
+    ::CloseHandle(worker);
+    EXPECT_EQ(TakeErrorInfo().description, "main thread");
+}

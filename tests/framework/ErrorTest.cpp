@@ -1,0 +1,151 @@
+// TE codes, default messages, the language table and the raise site's record.
+#include <gtest/gtest.h>
+
+#include <sstream>
+#include <string>
+
+#include "framework/DebugOutput.h"
+#include "framework/LanguageStrings.h"
+#include "framework/TEException.h"
+
+using namespace sm;
+
+namespace {
+TEException Catch(void (*raise)()) {
+    try {
+        raise();
+    } catch (const TEException& caught) {
+        return caught;
+    }
+    ADD_FAILURE() << "nothing was raised";
+    return {};
+}
+}  // namespace
+
+TEST(DefaultMessages, ComeFromTheCodesRow) {
+    EXPECT_EQ(GetTEErrorMessage(TE_OPERATION_TIMED_OUT), "Operation Timed Out.");
+    EXPECT_EQ(GetTEErrorMessage(TE_OPERATION_FAILED), "Operation Failed.");
+    EXPECT_EQ(GetTEErrorMessage(TE_TYPE_MISMATCH_ERROR),
+              "Variable or property types do not match or are not compatible.");
+    EXPECT_EQ(GetTEErrorMessage(TE_NO_FILE_ASSOC), "No application is associated with the given filename extension.");
+    EXPECT_EQ(GetTEErrorMessage(-1), "User-defined error code.");
+    EXPECT_EQ(GetTEErrorMessage(-17999), "User-defined error code.");
+}
+
+TEST(DefaultMessages, EveryTableRowHasItsOwnMessage) {
+    for (const TECodeRow* row = TECodeTable; row->name; ++row) {
+        std::string message = GetTEErrorMessage(row->code);
+        EXPECT_NE(message, "Internal Error, error code string not in table") << row->name;
+        EXPECT_NE(message, "User-defined error code.") << row->name;
+        EXPECT_LT(row->code, -16999) << row->name;
+    }
+}
+
+TEST(LanguageTable, LookupsIgnoreCaseOfSectionAndKey) {
+    EXPECT_EQ(GetLanguageString("te_errors", "te_operation_failed"), "Operation Failed.");
+    EXPECT_EQ(GetLanguageString("Err_Descr", "cant_find_file"), "Could not find file '%1'.");
+    EXPECT_EQ(GetLanguageString("lgw_toolerr", "LINETOOLONG"),
+              "A line in the file was longer than the supported maximum of %1 bytes.");
+}
+
+TEST(LanguageTable, MissingKeysGiveTheDefaultOrTheNotFoundText) {
+    EXPECT_EQ(GetLanguageString("TE_ERRORS", "NO_SUCH_KEY", "my default"), "my default");
+    EXPECT_EQ(GetLanguageString("TE_ERRORS", "NO_SUCH_KEY"), "String not found in the language resource files");
+    EXPECT_EQ(GetLanguageString("NO_SECTION", "TE_OPERATION_FAILED"), "String not found in the language resource files");
+}
+
+TEST(Raising, FillsTheRecordFromTheSite) {
+    TEException caught = Catch([] { TE_RAISE(TE_OPERATION_TIMED_OUT, "SessionBase::base_LockSession"); });
+    EXPECT_EQ(caught.GetErrorCode(), -17402);
+    EXPECT_STREQ(caught.GetDescription(), "Operation Timed Out.");
+    EXPECT_STREQ(caught.GetFunction(), "SessionBase::base_LockSession");
+    EXPECT_STREQ(caught.GetFile(), "ErrorTest.cpp");
+    EXPECT_GT(caught.GetLine(), 0);
+    EXPECT_STREQ(caught.GetCompileDate(), __DATE__);
+    EXPECT_EQ(std::string(caught.GetCompileTime()).size(), 8u);
+    EXPECT_STREQ(caught.GetSource(), "");
+    EXPECT_STREQ(caught.GetApiFunction(), "");
+    EXPECT_EQ(caught.GetApiErrorCode(), 0);
+}
+
+TEST(Raising, MessagesAndTheirFallbacks) {
+    EXPECT_STREQ(Catch([] { TE_RAISE(-1, "A::B"); }).GetDescription(), "User-defined error code.");
+    EXPECT_STREQ(Catch([] { TE_RAISE(TE_UNRECOGNIZED_VALUE, "A::B", ""); }).GetDescription(), "Unrecognized value.");
+    EXPECT_STREQ(Catch([] { TE_RAISE(TE_UNRECOGNIZED_VALUE, "A::B", "'X' is bad"); }).GetDescription(), "'X' is bad");
+    // A message held in a String is taken as it is, even when empty.
+    EXPECT_STREQ(Catch([] { TE_RAISE(TE_UNRECOGNIZED_VALUE, "A::B", DynamicString()); }).GetDescription(), "");
+    EXPECT_STREQ(Catch([] { TE_RAISE(0, "A::B"); }).GetDescription(), "");
+}
+
+TEST(Raising, LongNamesAreCutToTheirFields) {
+    static const std::string longName(300, 'f');
+    TEException caught = Catch([] { TE_RAISE(TE_PROGRAM_ERROR, longName.c_str()); });
+    EXPECT_EQ(std::string(caught.GetFunction()), std::string(256, 'f'));
+    caught.SetApiFunction(std::string(100, 'a').c_str());
+    EXPECT_EQ(std::string(caught.GetApiFunction()).size(), 64u);
+    caught.SetFunction(nullptr);
+    EXPECT_EQ(std::string(caught.GetFunction()).size(), 256u);
+    caught.SetSource(nullptr);
+    EXPECT_STREQ(caught.GetSource(), "");
+}
+
+TEST(Diagnostics, WriteDescriptionLines) {
+    TEException caught = Catch([] {
+        TE_RAISE(TE_DLL_NOT_LOADABLE, "CVXIPNPInstrSession::Initialize",
+                 RaiseDetails{.message = "Could not load.", .apiErrorCode = 126, .apiFunction = "LoadLibraryA",
+                              .source = "driver"});
+    });
+    std::ostringstream text;
+    caught.WriteDescription("CVXIPNPInstrSession::Initialize catch", text);
+    std::string expected = "Could not load.\nError Code: -17004\nAPI Function: LoadLibraryA, API Error Code: 126\n"
+                           "Source:'driver'\nWhere raised:  \n  function:  CVXIPNPInstrSession::Initialize\n"
+                           "  file:  ErrorTest.cpp\n  line:  " +
+                           std::to_string(caught.GetLine()) + "\n  compilation time:  " + caught.GetCompileTime() +
+                           "  " + caught.GetCompileDate() + "\n\nWhere caught:  CVXIPNPInstrSession::Initialize catch\n";
+    EXPECT_EQ(text.str(), expected);
+
+    TEException plain = Catch([] { TE_RAISE(TE_PROGRAM_ERROR, "A::B"); });
+    std::ostringstream short_;
+    plain.WriteDescription("here", short_);
+    EXPECT_EQ(short_.str().find("API Function"), std::string::npos);
+    EXPECT_EQ(short_.str().find("Source:"), std::string::npos);
+}
+
+TEST(Diagnostics, RaiseCanWriteToTheDebugOutputAtOnce) {
+    StartDebugOutputCapture();
+    Catch([] { TE_RAISE(TE_PROGRAM_ERROR, "A::B", RaiseDetails{.writeToDebugOutput = true}); });
+    std::string written = StopDebugOutputCapture();
+    EXPECT_NE(written.find("Program Error.\nError Code: -17001\n"), std::string::npos);
+    EXPECT_NE(written.find("Where caught:  Debugging When Exception Constructed\n"), std::string::npos);
+}
+
+TEST(Diagnostics, MissingArgumentWarningOnlyAboveLevelZero) {
+    StartDebugOutputCapture();
+    DynamicString quiet("x");
+    quiet.ReplaceArg(1, "y");
+    EXPECT_EQ(StopDebugOutputCapture(), "");
+
+    SetDebugOutputLevel(1);
+    StartDebugOutputCapture();
+    DynamicString loud("x");
+    loud.ReplaceArg(1, "y");
+    std::string written = StopDebugOutputCapture();
+    SetDebugOutputLevel(0);
+    EXPECT_EQ(written.rfind("WARNING! 'Could not find argument to replace in string' Line ", 0), 0u);
+    EXPECT_NE(written.find(" in function String::HandleMissingFormatArgument in file String.cpp\nCompilation Date: "),
+              std::string::npos);
+}
+
+TEST(SystemErrors, MapToFileCodes) {
+    EXPECT_EQ(SystemErrorToTECode(0), TE_IO_ERROR);
+    EXPECT_EQ(SystemErrorToTECode(1), TE_IO_ERROR);
+    EXPECT_EQ(SystemErrorToTECode(1157), TE_DLL_NOT_LOADABLE);
+    EXPECT_EQ(SystemErrorToTECode(2), TE_FILE_NOT_FOUND);
+    EXPECT_EQ(SystemErrorToTECode(65), TE_ACCESS_DENIED);
+    EXPECT_EQ(SystemErrorToTECode(183), TE_FILE_ALREADY_EXISTS);
+    EXPECT_EQ(SystemErrorToTECode(240), TE_BAD_NET_PATH);
+    EXPECT_EQ(SystemErrorToTECode(0x80004003u), TE_INVALID_POINTER);
+    EXPECT_EQ(SystemErrorToTECode(0x80020005u), TE_TYPE_MISMATCH_ERROR);
+    EXPECT_EQ(SystemErrorToTECode(0x8007000Eu), TE_OUT_OF_MEMORY);
+    EXPECT_EQ(SystemErrorToTECode(0x80070002u), TE_IO_ERROR);
+}

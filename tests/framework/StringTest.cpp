@@ -1,0 +1,236 @@
+// String family: storage kinds, copy-on-write sharing, character positions and message arguments.
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "framework/CodePage.h"
+#include "framework/String.h"
+#include "framework/TEException.h"
+
+using namespace sm;
+
+namespace {
+// Runs a test body under a double-byte code page and restores the previous one afterwards.
+class DoubleByteCodePage : public ::testing::Test {
+protected:
+    void SetUp() override {
+        previous = GetMultiByteCodePage();
+        ASSERT_TRUE(SetMultiByteCodePage(932));
+    }
+    void TearDown() override { SetMultiByteCodePage(previous); }
+    int previous = 0;
+};
+
+// Shift-JIS "a" in full width: lead 0x82, trail 0x81.
+const std::string wideA = "\x82\x81";
+}  // namespace
+
+TEST(StaticStringCut, KeepsFirstCapacityBytesOfLongerText) {
+    std::string text(300, 'x');
+    StaticString<256> cut(text);
+    EXPECT_EQ(cut.Size(), 256u);
+    EXPECT_EQ(cut.View(), std::string(256, 'x'));
+    StaticString<64> small("short");
+    EXPECT_STREQ(small.GetText(), "short");
+}
+
+TEST_F(DoubleByteCodePage, StaticStringNeverSplitsADoubleByteCharacter) {
+    // 255 single bytes then a double-byte character straddling byte 256: only 255 bytes fit whole.
+    std::string text(255, 'y');
+    text += wideA;
+    text += std::string(43, 'z');
+    StaticString<256> cut(text);
+    EXPECT_EQ(cut.Size(), 255u);
+    EXPECT_EQ(cut.View(), std::string(255, 'y'));
+
+    std::string aligned(254, 'y');
+    aligned += wideA + "tail";
+    StaticString<256> whole(aligned);
+    EXPECT_EQ(whole.Size(), 256u);
+    EXPECT_EQ(whole.View().substr(254), wideA);
+}
+
+TEST_F(DoubleByteCodePage, PositionsCountCharactersNotBytes) {
+    DynamicString text(wideA + "b" + wideA + "c");
+    EXPECT_EQ(text.CharCount(), 4u);
+    std::size_t found = 99;
+    ASSERT_TRUE(text.Find("c", 0, false, &found));
+    EXPECT_EQ(found, 3u);
+    DynamicString middle;
+    text.Mid(1, 2, middle);
+    EXPECT_EQ(middle.View(), "b" + wideA);
+    text.Delete(0, 1);
+    EXPECT_EQ(text.View(), "b" + wideA + "c");
+    text.Insert("X", 2);
+    EXPECT_EQ(text.View(), "b" + wideA + "Xc");
+}
+
+TEST_F(DoubleByteCodePage, FindNeverMatchesInsideADoubleByteCharacter) {
+    // 0x82 0x61: the trail byte is 'a', which must not be found as a character of its own.
+    DynamicString text(std::string("\x82\x61") + "xa");
+    std::size_t found = 99;
+    ASSERT_TRUE(text.Find("a", 0, false, &found));
+    EXPECT_EQ(found, 2u);
+}
+
+TEST_F(DoubleByteCodePage, AssignBytesCountsBackToWholeCharacters) {
+    std::string text = "ab" + wideA;
+    DynamicString cut;
+    cut.AssignBytes(text.c_str(), 3);
+    EXPECT_EQ(cut.View(), "ab");
+    cut.AssignChars(text.c_str(), 3);
+    EXPECT_EQ(cut.View(), text);
+}
+
+TEST(DynamicStringSharing, CopiesShareOneBufferUntilWritten) {
+    DynamicString first("shared text");
+    DynamicString second(first);
+    EXPECT_EQ(first.SharedBuffer(), second.SharedBuffer());
+    DynamicString third;
+    third.Assign(first);
+    EXPECT_EQ(third.SharedBuffer(), first.SharedBuffer());
+
+    second.Append(" changed");
+    EXPECT_STREQ(first.GetText(), "shared text");
+    EXPECT_STREQ(second.GetText(), "shared text changed");
+    EXPECT_STREQ(third.GetText(), "shared text");
+    EXPECT_NE(second.SharedBuffer(), first.SharedBuffer());
+
+    char* raw = third.GetWritableText();
+    raw[0] = 'S';
+    EXPECT_STREQ(first.GetText(), "shared text");
+    EXPECT_STREQ(third.GetText(), "Shared text");
+}
+
+TEST(DynamicStringSharing, NewStringsStartOnTheGlobalEmptyBuffer) {
+    DynamicString a, b;
+    EXPECT_EQ(a.SharedBuffer(), CopyOnWriteMemory::GlobalEmpty());
+    EXPECT_EQ(a.SharedBuffer(), b.SharedBuffer());
+    a.Append("x");
+    EXPECT_STREQ(b.GetText(), "");
+    EXPECT_NE(a.SharedBuffer(), CopyOnWriteMemory::GlobalEmpty());
+}
+
+TEST(DynamicStringSharing, SelfReferencingEditsAreSafe) {
+    DynamicString text("abc");
+    text.Append(text);
+    EXPECT_STREQ(text.GetText(), "abcabc");
+    text.Mid(1, 2, text);
+    EXPECT_STREQ(text.GetText(), "bc");
+}
+
+TEST(DynamicStringGrowth, GrowsByAThirtySecondPlusFourRoundedToFour) {
+    DynamicString text;
+    text.Append("x");
+    std::size_t capacity = text.GetCapacity();
+    // Repeated appends must not reallocate every time: count distinct capacities over 1000 appends.
+    int growths = 0;
+    for (int i = 0; i < 1000; ++i) {
+        text.Append("y");
+        if (text.GetCapacity() != capacity) {
+            ++growths;
+            capacity = text.GetCapacity();
+            EXPECT_EQ((capacity + 1) % 4, 0u);
+        }
+    }
+    EXPECT_LT(growths, 100);
+    EXPECT_EQ(text.Size(), 1001u);
+}
+
+TEST(StringCompare, CaseRulesAndCountedForms) {
+    DynamicString text("IdQuery=1");
+    EXPECT_EQ(text.Compare("idquery=1", true), 0);
+    EXPECT_NE(text.Compare("idquery=1", false), 0);
+    EXPECT_LT(DynamicString("abc").Compare("abd", false), 0);
+    EXPECT_GT(DynamicString("abd").Compare("abc", false), 0);
+    EXPECT_LT(DynamicString("ab").Compare("abc", false), 0);
+    EXPECT_EQ(text.Compare("IDQxxx", true, 3), 0);
+    EXPECT_EQ(text.Compare("query", true, 5, 2), 0);
+    EXPECT_TRUE(text.BeginsWith("idq", true));
+    EXPECT_FALSE(text.BeginsWith("idq", false));
+    EXPECT_FALSE(DynamicString("id").BeginsWith("idq", true));
+}
+
+TEST(StringFind, CaseInsensitiveFindsUpperInLower) {
+    DynamicString text("idQuery=1");
+    std::size_t found = 99;
+    ASSERT_TRUE(text.Find("IDQUERY", 0, true, &found));
+    EXPECT_EQ(found, 0u);
+    EXPECT_FALSE(text.Find("IDQUERY", 0, false, &found));
+    EXPECT_FALSE(text.Find("id", 1, true, &found));
+    ASSERT_TRUE(DynamicString("a=b;a=c").Find("a=", 1, false, &found));
+    EXPECT_EQ(found, 4u);
+}
+
+TEST(StringEdits, TrimDeleteInsertReplace) {
+    DynamicString text(" \t name \r\n");
+    text.Trim();
+    EXPECT_STREQ(text.GetText(), "name");
+    DynamicString blanks("   ");
+    blanks.Trim();
+    EXPECT_STREQ(blanks.GetText(), "");
+
+    DynamicString edit("0123456789");
+    edit.Delete(3, 2);
+    EXPECT_STREQ(edit.GetText(), "01256789");
+    edit.Delete(5, -1);
+    EXPECT_STREQ(edit.GetText(), "01256");
+    edit.Insert("ab", 0);
+    EXPECT_STREQ(edit.GetText(), "ab01256");
+    edit.Insert("Z", 100);
+    EXPECT_STREQ(edit.GetText(), "ab01256Z");
+
+    DynamicString replace("one TWO two");
+    EXPECT_TRUE(replace.ReplaceFirst("two", "2", true));
+    EXPECT_STREQ(replace.GetText(), "one 2 two");
+    EXPECT_FALSE(replace.ReplaceFirst("three", "3", true));
+}
+
+TEST(StringReplaceArg, FillsFirstPlaceholderOnly) {
+    DynamicString message("The value '%1' is not a valid value.");
+    message.ReplaceArg(1, "abc");
+    EXPECT_STREQ(message.GetText(), "The value 'abc' is not a valid value.");
+
+    DynamicString twice("%1 and %1");
+    twice.ReplaceArg(1, "x");
+    EXPECT_STREQ(twice.GetText(), "x and %1");
+
+    DynamicString numbered("code %1, path %2");
+    numbered.ReplaceArg(1, std::int64_t{-17402}, "%d");
+    numbered.ReplaceArg(2, std::string_view("C:\\x"));
+    EXPECT_STREQ(numbered.GetText(), "code -17402, path C:\\x");
+}
+
+TEST(StringReplaceArg, MissingPlaceholderAppendsTheTail) {
+    DynamicString message("No placeholder here");
+    message.ReplaceArg(2, "x");
+    EXPECT_STREQ(message.GetText(), "No placeholder here COULD NOT FIND %2TO REPLACE WITH x ");
+}
+
+TEST(StringNumbers, FullSixtyFourBitValues) {
+    DynamicString text;
+    text.AppendInteger(INT64_MIN);
+    EXPECT_STREQ(text.GetText(), "-9223372036854775808");
+    text.Empty();
+    text.AppendUnsigned(UINT64_MAX);
+    EXPECT_STREQ(text.GetText(), "18446744073709551615");
+    text.Empty();
+    text.AppendUnsigned(0x123456789ABCDEF0ull, "%x");
+    EXPECT_STREQ(text.GetText(), "123456789abcdef0");
+    text.Empty();
+    text.AppendDouble(0.1);
+    EXPECT_STREQ(text.GetText(), "0.1");
+    text.Empty();
+    text.AppendDouble(1.0 / 3.0);
+    EXPECT_STREQ(text.GetText(), "0.3333333333333");
+}
+
+TEST(BufferStringKind, WritesAreCutToTheCallersBuffer) {
+    char storage[8] = "";
+    BufferString view(storage, 7);
+    view.Assign("0123456789");
+    EXPECT_STREQ(storage, "0123456");
+    BufferString literal("fixed");
+    EXPECT_STREQ(literal.GetText(), "fixed");
+    EXPECT_THROW(literal.Append("x"), TEException);
+}
