@@ -1,0 +1,109 @@
+// DllRegisterServer and DllUnregisterServer: the ProgID and CLSID keys of every class in the object
+// map, and the type library.
+#include <windows.h>
+#include <ole2.h>
+
+#include <string>
+
+#include "com/ComPtr.h"
+#include "com/Interfaces.h"
+#include "com/TypeLibrary.h"
+#include "com/UniqueHandles.h"
+#include "server/ObjectMap.h"
+
+namespace sm {
+namespace {
+
+std::string GuidText(const GUID& guid) {
+    wchar_t wide[40] = {};
+    ::StringFromGUID2(guid, wide, 40);
+    char narrow[40] = {};
+    ::WideCharToMultiByte(CP_ACP, 0, wide, -1, narrow, sizeof narrow, nullptr, nullptr);
+    return narrow;
+}
+
+std::string ModulePath() {
+    char path[MAX_PATH + 1] = {};
+    ::WideCharToMultiByte(CP_ACP, 0, GetOwnModulePath(), -1, path, MAX_PATH, nullptr, nullptr);
+    return path;
+}
+
+// Creates root\subKey (and its parents) and sets one string value; a null value name is the default.
+LSTATUS SetString(HKEY root, const std::string& subKey, const char* valueName, const std::string& value) {
+    UniqueRegistryKey key;
+    LSTATUS status = ::RegCreateKeyExA(root, subKey.c_str(), 0, nullptr, 0, KEY_WRITE, nullptr, key.Put(), nullptr);
+    if (status != ERROR_SUCCESS) return status;
+    return ::RegSetValueExA(key.Get(), valueName, 0, REG_SZ, reinterpret_cast<const BYTE*>(value.c_str()),
+                            static_cast<DWORD>(value.size() + 1));
+}
+
+LSTATUS CreateKey(HKEY root, const std::string& subKey) {
+    UniqueRegistryKey key;
+    return ::RegCreateKeyExA(root, subKey.c_str(), 0, nullptr, 0, KEY_WRITE, nullptr, key.Put(), nullptr);
+}
+
+LSTATUS DeleteTree(HKEY root, const std::string& subKey) {
+    LSTATUS status = ::RegDeleteTreeA(root, subKey.c_str());
+    if (status == ERROR_SUCCESS) status = ::RegDeleteKeyA(root, subKey.c_str());
+    return status == ERROR_FILE_NOT_FOUND ? ERROR_SUCCESS : status;
+}
+
+HRESULT Check(LSTATUS status) { return status == ERROR_SUCCESS ? S_OK : HRESULT_FROM_WIN32(status); }
+
+HRESULT RegisterClass(const ObjectMapEntry& entry) {
+    std::string name = entry.className;
+    std::string description = name + " Class";
+    std::string classIdText = GuidText(*entry.classId);
+    std::string progId = "SessionMgr." + name + ".1";
+    std::string independentProgId = "SessionMgr." + name;
+    std::string classKey = "CLSID\\" + classIdText;
+    const LSTATUS steps[] = {
+        SetString(HKEY_CLASSES_ROOT, progId, nullptr, description),
+        SetString(HKEY_CLASSES_ROOT, progId + "\\CLSID", nullptr, classIdText),
+        SetString(HKEY_CLASSES_ROOT, independentProgId, nullptr, description),
+        SetString(HKEY_CLASSES_ROOT, independentProgId + "\\CLSID", nullptr, classIdText),
+        SetString(HKEY_CLASSES_ROOT, independentProgId + "\\CurVer", nullptr, progId),
+        // The class key is replaced whole, so nothing of an older registration survives.
+        DeleteTree(HKEY_CLASSES_ROOT, classKey),
+        SetString(HKEY_CLASSES_ROOT, classKey, nullptr, description),
+        SetString(HKEY_CLASSES_ROOT, classKey + "\\ProgID", nullptr, progId),
+        SetString(HKEY_CLASSES_ROOT, classKey + "\\VersionIndependentProgID", nullptr, independentProgId),
+        CreateKey(HKEY_CLASSES_ROOT, classKey + "\\Programmable"),
+        SetString(HKEY_CLASSES_ROOT, classKey + "\\InprocServer32", nullptr, ModulePath()),
+        SetString(HKEY_CLASSES_ROOT, classKey + "\\InprocServer32", "ThreadingModel", "Free"),
+        SetString(HKEY_CLASSES_ROOT, classKey + "\\TypeLib", nullptr, GuidText(LIBID_SM)),
+    };
+    for (LSTATUS status : steps)
+        if (status != ERROR_SUCCESS) return Check(status);
+    return S_OK;
+}
+
+HRESULT UnregisterClass(const ObjectMapEntry& entry) {
+    std::string name = entry.className;
+    const LSTATUS steps[] = {
+        DeleteTree(HKEY_CLASSES_ROOT, "SessionMgr." + name + ".1"),
+        DeleteTree(HKEY_CLASSES_ROOT, "SessionMgr." + name),
+        DeleteTree(HKEY_CLASSES_ROOT, "CLSID\\" + GuidText(*entry.classId)),
+    };
+    for (LSTATUS status : steps)
+        if (status != ERROR_SUCCESS) return Check(status);
+    return S_OK;
+}
+
+}  // namespace
+}  // namespace sm
+
+using namespace sm;
+
+extern "C" HRESULT STDAPICALLTYPE DllRegisterServer() {
+    for (const ObjectMapEntry& entry : GetObjectMap())
+        if (HRESULT result = RegisterClass(entry); FAILED(result)) return result;
+    ComPtr<ITypeLib> library;
+    return ::LoadTypeLibEx(GetOwnModulePath(), REGKIND_REGISTER, library.Put());
+}
+
+extern "C" HRESULT STDAPICALLTYPE DllUnregisterServer() {
+    for (const ObjectMapEntry& entry : GetObjectMap())
+        if (HRESULT result = UnregisterClass(entry); FAILED(result)) return result;
+    return ::UnRegisterTypeLib(LIBID_SM, 1, 0, 0x409, SYS_WIN64);
+}

@@ -1,0 +1,113 @@
+// The category-independent part of every session: identity, data items, the keyed session lock,
+// the close function and the helpers category classes share. Automation wrappers (InstrSession.h)
+// call these operations with converted arguments while holding objectLock.
+#pragma once
+
+#include <condition_variable>
+#include <cstdint>
+#include <memory>
+#include <mutex>
+#include <string_view>
+#include <vector>
+
+#include "com/ComPtr.h"
+#include "com/Interfaces.h"
+#include "com/UniqueHandles.h"
+#include "framework/String.h"
+#include "sessions/SessionOwner.h"
+#include "sessions/VPPBaseCaller.h"
+
+namespace sm {
+
+enum class DataItemKind : std::int32_t { Object = 0, Long = 1, String = 2, LongPtr = 3 };
+
+struct DataItem {
+    DataItemKind kind = DataItemKind::Long;
+    DynamicString id;
+    DynamicString clsid;
+    ComPtr<IUnknown> object;
+    bool releaseOnClose = false;
+    std::int64_t value = 0;
+    DynamicString text;
+};
+
+class SessionBase : public VPPBaseCaller {
+public:
+    SessionBase();
+    ~SessionBase() override;
+    SessionBase(const SessionBase&) = delete;
+    SessionBase& operator=(const SessionBase&) = delete;
+
+    virtual void GetName(String& result) const { result.Assign(name); }
+    virtual void GetCategory(String& result) const { result.Assign(category); }
+    virtual void SetName(const String& value) { name.Assign(value); }
+    virtual void SetCategory(const String& value) { category.Assign(value); }
+    virtual bool HasName(std::string_view candidate) const;
+    virtual bool AcceptsSubcategory(std::string_view subCategory) const;
+
+    // Set by the manager right after creation; the session keeps a counted reference on it.
+    void AttachToOwner(SessionOwner* owner, bool external);
+    SessionOwner* Owner() const { return owner; }
+    bool IsInExternalProcess() const { return inExternalProcess; }
+    void SetInExternalProcess(bool value) { inExternalProcess = value; }
+
+    // Data items.
+    void GenerateUniqueID(String& result);
+    DataItem* FindDataItem(std::string_view id);
+    void base_AttachObject(std::string_view id, IUnknown* object, std::string_view clsid, bool releaseOnClose);
+    void base_AttachLong(std::string_view id, std::int32_t value);
+    void base_AttachLongPtr(std::string_view id, const VARIANT& value);
+    void base_AttachString(std::string_view id, std::string_view value);
+    ComPtr<IUnknown> base_GetObject(std::string_view id);
+    std::int32_t base_GetLong(std::string_view id);
+    void base_GetLongPtr(std::string_view id, VARIANT* result);
+    void base_GetString(std::string_view id, String& result);
+    void DetachData(std::string_view id);
+
+    // The keyed, nestable, advisory session lock.
+    bool TryLockSession(std::string_view key);
+    void base_LockSession(std::string_view key, double timeoutSeconds);
+    void base_UnlockSession();
+    void GetLockState(String& ownerKey, std::int32_t& nestingLevel);
+
+    // Calls the close function once (it is cleared first) and drops release-on-close objects.
+    void RunCloseActions(IInstrSession* self);
+    void AppendDataItemsDescription(String& text) const;
+
+    static bool ExtractInitOption(String& options, std::string_view optionName, String& value);
+    static bool GetBooleanInitOptionValue(std::string_view value);
+    static std::uint64_t Variant2Pointer(const VARIANT& value);
+
+    // Serialises the automation methods; recursive, so a close function may call back in.
+    CriticalSection objectLock;
+
+protected:
+    bool initialized = false;
+    bool inExternalProcess = false;
+    DynamicString name;
+    DynamicString category;
+    bool closeEnabled = true;
+    std::uint64_t closeFunction = 0;
+    std::uint32_t uniqueIdCounter = 0;
+    std::vector<std::unique_ptr<DataItem>> dataItems;
+    DynamicString driverLibraryPath;
+    DynamicString lockKey;
+    std::int32_t lockLevel = 0;
+
+private:
+    void AppendItem(std::unique_ptr<DataItem> item, std::string_view id);
+    DataItem& FindItemOfKind(std::string_view id, DataItemKind kind, const char* function);
+
+    SessionOwner* owner = nullptr;
+    ComPtr<IUnknown> ownerReference;
+    // Waiters for the session lock sleep here between attempts; a release wakes them at once
+    // instead of leaving them to their next poll.
+    std::mutex releaseMutex;
+    std::condition_variable released;
+    std::uint64_t releaseCount = 0;
+
+    template <class Session>
+    friend class InstrSession;
+};
+
+}  // namespace sm
