@@ -56,6 +56,7 @@ public:
     UniqueVariant() { ::VariantInit(&value); }
     UniqueVariant(const UniqueVariant&) = delete;
     UniqueVariant& operator=(const UniqueVariant&) = delete;
+    UniqueVariant(UniqueVariant&& other) noexcept : value(other.value) { ::VariantInit(&other.value); }
     ~UniqueVariant() { ::VariantClear(&value); }
     VARIANT* operator&() { return &value; }
     VARIANT* Get() { return &value; }
