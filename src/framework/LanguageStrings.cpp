@@ -55,6 +55,19 @@ constexpr LanguageRow builtInRows[] = {
 
     {"ERR_DESCR", "CANT_FIND_FILE", "Could not find file '%1'."},
     {"ERR_DESCR", "TE_CANT_READ_FILE_ELAB", "Error reading from file '%1'."},
+    {"ERR_DESCR", "PATH_TOO_LONG", "The path '%1' is longer than the supported maximum of 260 bytes."},
+    {"ERR_DESCR", "INI_INVALID_SECTION_NAME",
+     "The section name '%1' cannot be stored in an INI file: it holds a line break or begins or ends with white space."},
+    {"ERR_DESCR", "INI_INVALID_ITEM_NAME",
+     "The item name '%1' cannot be stored in an INI file: it is empty, holds '=' or a line break, begins with ';' or "
+     "'[', or begins or ends with white space."},
+    {"ERR_DESCR", "INI_VALUE_HAS_LINE_BREAK",
+     "The value of the item '%1' holds a line break, which an INI file cannot store; escape the value first."},
+    {"ERR_DESCR", "INI_ITEM_READ_AS_PIECE",
+     "The item '%1' in section '%2' cannot be written: its name would be read back as part of a value split over "
+     "several lines."},
+    {"ERR_DESCR", "INI_ITEM_NOT_WRITABLE",
+     "The item '%1' in section '%2' cannot be written so that it reads back unchanged."},
 
     {"LGW_TOOLERR", "CouldNotOpenFileForReading", "Could Not Open File For Reading"},
     {"LGW_TOOLERR", "ErrorReadingFile", "Error Reading From File"},
