@@ -1,0 +1,181 @@
+// The name syntax every caller relies on: where a category ends (separator position and length) and
+// how the external-process prefixes are recognised, removed and added.
+#include <gtest/gtest.h>
+
+#include <string>
+
+#include "framework/CodePage.h"
+#include "sources/SessionName.h"
+
+using namespace sm;
+
+namespace {
+struct Separator {
+    std::size_t position = 0;
+    std::size_t length = 0;
+};
+
+// Runs FindCategorySeparator; a missing separator fails the calling test.
+Separator SeparatorOf(const std::string& text) {
+    Separator found{99, 99};
+    EXPECT_TRUE(FindCategorySeparator(text, &found.position, &found.length)) << "text " << text;
+    return found;
+}
+
+class DoubleByteCodePage : public ::testing::Test {
+protected:
+    void SetUp() override {
+        previous = GetMultiByteCodePage();
+        ASSERT_TRUE(SetMultiByteCodePage(932));
+    }
+    void TearDown() override { SetMultiByteCodePage(previous); }
+    int previous = 0;
+};
+
+// Shift-JIS characters: a full-width letter, and one whose trail byte is a backslash (0x5C).
+const std::string wideA = "\x82\x81";
+const std::string trailBackslash = "\x83\x5C";
+}  // namespace
+
+TEST(CategorySeparator, EveryFormHasItsLength) {
+    const struct {
+        const char* separator;
+        std::size_t length;
+    } forms[] = {
+        {":", 1},      {"::", 2},    {":\\", 2}, {":/", 2},   {":\\\\", 3}, {"://", 3},   {":/\\", 3},
+        {":\\/", 3},   {"/", 1},     {"//", 2},  {"/\\", 2},  {"\\", 1},    {"\\\\", 2}, {"\\/", 2},
+    };
+    for (const auto& form : forms) {
+        Separator found = SeparatorOf(std::string("VISA") + form.separator + "GPIB0");
+        EXPECT_EQ(found.position, 4u) << "separator " << form.separator;
+        EXPECT_EQ(found.length, form.length) << "separator " << form.separator;
+    }
+}
+
+TEST(CategorySeparator, LengthIsDecidedAtTheFirstSeparatorCharacter) {
+    // Only the characters after the first one count; longer runs are cut at the longest form.
+    EXPECT_EQ(SeparatorOf("A:::B").length, 2u);
+    EXPECT_EQ(SeparatorOf("A///B").length, 2u);
+    EXPECT_EQ(SeparatorOf("A:\\\\\\B").length, 3u);
+    // A slash or backslash run never absorbs a colon.
+    EXPECT_EQ(SeparatorOf("A/:B").length, 1u);
+    EXPECT_EQ(SeparatorOf("A\\:B").length, 1u);
+    // The first separator character wins over a longer form later in the text.
+    Separator first = SeparatorOf("GPIB0::3/x");
+    EXPECT_EQ(first.position, 5u);
+    EXPECT_EQ(first.length, 2u);
+    Separator slashFirst = SeparatorOf("A/B::C");
+    EXPECT_EQ(slashFirst.position, 1u);
+    EXPECT_EQ(slashFirst.length, 1u);
+}
+
+TEST(CategorySeparator, AtTheEdgesOfTheText) {
+    Separator leading = SeparatorOf("::DMM1");
+    EXPECT_EQ(leading.position, 0u);
+    EXPECT_EQ(leading.length, 2u);
+    Separator trailing = SeparatorOf("CUSTOM:");
+    EXPECT_EQ(trailing.position, 6u);
+    EXPECT_EQ(trailing.length, 1u);
+    EXPECT_EQ(SeparatorOf("CUSTOM::").length, 2u);
+    EXPECT_EQ(SeparatorOf("CUSTOM:/\\").length, 3u);
+}
+
+TEST(CategorySeparator, AbsentInPlainNamesAndEmptyText) {
+    std::size_t position = 7, length = 7;
+    EXPECT_FALSE(FindCategorySeparator("", &position, &length));
+    EXPECT_FALSE(FindCategorySeparator("DMM1", &position, &length));
+    EXPECT_FALSE(FindCategorySeparator("a.b-c_d*e|f", &position, &length));
+    // Outputs are optional.
+    EXPECT_TRUE(FindCategorySeparator("IVI/DMM1", nullptr, nullptr));
+}
+
+TEST_F(DoubleByteCodePage, SeparatorPositionCountsCharacters) {
+    Separator found = SeparatorOf(wideA + wideA + "::x");
+    EXPECT_EQ(found.position, 2u);
+    EXPECT_EQ(found.length, 2u);
+    Separator mixed = SeparatorOf("a" + wideA + "b/" + wideA);
+    EXPECT_EQ(mixed.position, 3u);
+    EXPECT_EQ(mixed.length, 1u);
+}
+
+TEST_F(DoubleByteCodePage, TrailByteBackslashIsNoSeparator) {
+    // A byte scan would stop inside the double-byte character at its 0x5C trail byte.
+    std::size_t position = 7, length = 7;
+    EXPECT_FALSE(FindCategorySeparator(trailBackslash + "DMM", &position, &length));
+    Separator found = SeparatorOf(trailBackslash + trailBackslash + "::DMM");
+    EXPECT_EQ(found.position, 2u);
+    EXPECT_EQ(found.length, 2u);
+    // A double-byte character right after a colon does not lengthen the separator.
+    Separator colon = SeparatorOf("IVI:" + trailBackslash);
+    EXPECT_EQ(colon.position, 3u);
+    EXPECT_EQ(colon.length, 1u);
+}
+
+TEST(ExternalPrefix, RecognisedForms) {
+    const struct {
+        const char* text;
+        bool external;
+        int processIndex;
+        const char* stripped;
+        const char* added;
+    } cases[] = {
+        {"*VISA::x", true, 0, "VISA::x", "*VISA::x"},
+        {"32*RQ", true, 1, "RQ", "32*RQ"},
+        {"32*rq", true, 1, "rq", "32*rq"},
+        {"32*RQ::Route1", true, 1, "RQ::Route1", "32*RQ::Route1"},
+        {"32*rq::Route1", true, 1, "rq::Route1", "32*rq::Route1"},
+        // Only the switch category has a 32-bit external process.
+        {"32*VISA::x", false, 0, "32*VISA::x", "*32*VISA::x"},
+        {"32*RQX", false, 0, "32*RQX", "*32*RQX"},
+        {"32*RQ:Route1", false, 0, "32*RQ:Route1", "*32*RQ:Route1"},
+        // One "*" is one prefix: a second one belongs to the name.
+        {"**x", true, 0, "*x", "**x"},
+        {"*", true, 0, "", "*"},
+        {"VISA::x", false, 0, "VISA::x", "*VISA::x"},
+        {"", false, 0, "", "*"},
+        {"x*", false, 0, "x*", "*x*"},
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.text);
+        EXPECT_EQ(HasExternalPrefix(c.text), c.external);
+        EXPECT_EQ(ExternalProcessIndex(c.text), c.processIndex);
+        DynamicString stripped(c.text);
+        StripExternalPrefix(stripped);
+        EXPECT_EQ(stripped.View(), c.stripped);
+        DynamicString added(c.text);
+        AddExternalPrefix(added);
+        EXPECT_EQ(added.View(), c.added);
+    }
+}
+
+TEST(ExternalPrefix, WorksOnFixedCapacityText) {
+    // The session name property applies the prefix to a 260-byte path-sized buffer too.
+    StaticString<260> name("32*RQ::Route1");
+    StripExternalPrefix(name);
+    EXPECT_EQ(name.View(), "RQ::Route1");
+    AddExternalPrefix(name);
+    EXPECT_EQ(name.View(), "*RQ::Route1");
+}
+
+TEST_F(DoubleByteCodePage, PrefixesAroundDoubleByteNames) {
+    DynamicString text("*" + wideA + "::x");
+    StripExternalPrefix(text);
+    EXPECT_EQ(text.View(), wideA + "::x");
+    AddExternalPrefix(text);
+    EXPECT_EQ(text.View(), "*" + wideA + "::x");
+    DynamicString route("32*RQ::" + wideA);
+    EXPECT_EQ(ExternalProcessIndex(route.View()), 1);
+    StripExternalPrefix(route);
+    EXPECT_EQ(route.View(), "RQ::" + wideA);
+}
+
+TEST(CategoryCompare, AnyAndCaseInsensitiveTokens) {
+    EXPECT_TRUE(IsAnyCategory(""));
+    EXPECT_TRUE(IsAnyCategory("?"));
+    EXPECT_FALSE(IsAnyCategory("??"));
+    EXPECT_FALSE(IsAnyCategory(" "));
+    EXPECT_TRUE(SameCategory("visa", CategoryVISA));
+    EXPECT_TRUE(SameCategory("VxiPnp", CategoryVXIPNP));
+    EXPECT_FALSE(SameCategory("VISA ", CategoryVISA));
+    EXPECT_FALSE(SameCategory("VIS", CategoryVISA));
+}
