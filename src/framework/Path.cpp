@@ -111,10 +111,11 @@ Path Path::Parent() const {
     return Path(view.substr(0, last));
 }
 
-bool Path::IsAbsolute() const {
-    std::string_view view = View();
-    return (!view.empty() && view[0] == '\\') || (StartsWithDrive(view) && view.size() >= 3 && view[2] == '\\');
+bool IsAbsolutePathText(std::string_view text) {
+    return (!text.empty() && text[0] == '\\') || (StartsWithDrive(text) && text.size() >= 3 && text[2] == '\\');
 }
+
+bool Path::IsAbsolute() const { return IsAbsolutePathText(View()); }
 
 bool Path::Exists() const {
     std::string name(View());

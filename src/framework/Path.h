@@ -48,6 +48,9 @@ private:
     StaticString<capacity> text;
 };
 
+// Begins with a backslash, or with a drive letter, ':' and a backslash.
+bool IsAbsolutePathText(std::string_view text);
+
 // The framework's path check: length below 260 bytes, a drive ("C:", "C:dir" counts as "C:\dir"),
 // a UNC root ("\\server\share") or a relative start, no empty component between two separators, and
 // no < > | : / \ " CR LF in a component; the wildcards * and ? only in the last component and only

@@ -1,0 +1,186 @@
+// The product directories against a machine described by a table: installed and development
+// layouts, registry overrides and their views, and the caches.
+#include <gtest/gtest.h>
+
+#include <map>
+#include <set>
+#include <string>
+#include <tuple>
+
+#include "framework/DirectoryGetter.h"
+#include "framework/TEException.h"
+
+using namespace sm;
+
+namespace {
+
+class TableSystem final : public DirectorySystem {
+public:
+    std::optional<std::string> LoadedFrameworkModulePath() override { return framework; }
+    std::optional<std::string> ClassesRootDefaultValue(std::string_view key) override {
+        auto found = classesRoot.find(std::string(key));
+        if (found == classesRoot.end()) return std::nullopt;
+        return found->second;
+    }
+    std::optional<std::string> MachineValue(std::string_view key, std::string_view name, bool view64) override {
+        auto found = machine.find({std::string(key), std::string(name), view64});
+        if (found == machine.end()) return std::nullopt;
+        return found->second;
+    }
+    std::string ShellFolder(int csidl) override {
+        ++shellRequests;
+        if (csidl == 46) return "C:\\Users\\Public\\Documents";
+        if (csidl == 35) return "C:\\ProgramData";
+        if (csidl == 28) return "C:\\Users\\me\\AppData\\Local";
+        TE_RAISE(TE_PATH_NOT_FOUND, "TableSystem::ShellFolder");
+    }
+    bool FileExists(std::string_view path) override { return files.count(std::string(path)) != 0; }
+
+    void RegisterEngine(const std::string& path) { classesRoot[engineKey] = path; }
+
+    std::optional<std::string> framework;
+    std::map<std::string, std::string> classesRoot;
+    std::map<std::tuple<std::string, std::string, bool>, std::string> machine;
+    std::set<std::string> files;
+    int shellRequests = 0;
+
+    static constexpr const char* engineKey = "CLSID\\{E17A3C92-4B08-4F6D-95E1-A2C7083D5B64}\\InprocServer32";
+};
+
+const std::string beacon = "DEV BUILD BEACON (Do not delete or install).txt";
+
+}  // namespace
+
+TEST(InstalledLayout, ShellFoldersPlusProductFolders) {
+    TableSystem system;
+    DirectoryGetter getter("2021 (64-bit)", system);
+    EXPECT_FALSE(getter.IsDevBuild());
+    EXPECT_EQ(getter.GetPublicDirectory().View(), "C:\\Users\\Public\\Documents\\Quillvane\\Verentis 2021 (64-bit)\\");
+    EXPECT_EQ(getter.GetCommonAppDataDirectory().View(), "C:\\ProgramData\\Quillvane\\Verentis 2021 (64-bit)\\");
+    EXPECT_EQ(getter.GetLocalAppDataDirectory().View(), "C:\\Users\\me\\AppData\\Local\\Quillvane\\Verentis 2021 (64-bit)\\");
+    EXPECT_EQ(getter.GetDefaultConfigDirectory().View(), "C:\\ProgramData\\Quillvane\\Verentis 2021 (64-bit)\\Cfg\\");
+    EXPECT_EQ(getter.GetConfigDirectory("2021", true).View(), getter.GetDefaultConfigDirectory().View());
+    EXPECT_EQ(getter.GetPublicDirectory("2021", true).View(), getter.GetPublicDirectory().View());
+}
+
+TEST(InstalledLayout, NoEngineAndNoFrameworkModuleMeansNoInstallation) {
+    TableSystem system;
+    DirectoryGetter getter("2021", system);
+    TEException raised;
+    try {
+        getter.GetInstallationDirectory();
+        ADD_FAILURE() << "nothing was raised";
+    } catch (const TEException& caught) {
+        raised = caught;
+    }
+    EXPECT_EQ(raised.GetErrorCode(), TE_OPERATION_FAILED);
+    EXPECT_STREQ(raised.GetDescription(), "Verentis Engine not registered");
+    EXPECT_STREQ(raised.GetFunction(), "DirectoryGetter::GetActiveTEDirectoryFromRegistry");
+}
+
+TEST(InstalledLayout, InstallationIsThreeComponentsAboveTheEngineModule) {
+    TableSystem system;
+    system.RegisterEngine("D:\\Prod\\Verentis\\Bin\\x64\\Engine.dll");
+    DirectoryGetter getter("2021", system);
+    EXPECT_EQ(getter.GetInstallationDirectory().View(), "D:\\Prod\\Verentis\\");
+    EXPECT_FALSE(getter.IsDevBuild());
+    EXPECT_EQ(getter.GetProgramsDirectory().View(), "D:\\Prod\\Verentis\\Bin\\");
+
+    TableSystem shallow;
+    shallow.RegisterEngine("C:\\Engine\\Engine.dll");
+    EXPECT_EQ(DirectoryGetter("2021", shallow).GetInstallationDirectory().View(), "C:\\");
+}
+
+TEST(InstalledLayout, TheLoadedFrameworkModuleWinsOverTheRegistration) {
+    TableSystem system;
+    system.RegisterEngine("D:\\Prod\\Verentis\\Bin\\x64\\Engine.dll");
+    system.framework = "E:\\Tree\\Verentis\\Bin\\x64\\Release\\vantrel.dll";
+    DirectoryGetter getter("2021", system);
+    EXPECT_EQ(getter.GetInstallationDirectory().View(), "E:\\Tree\\Verentis\\");
+}
+
+TEST(DevelopmentLayout, TheBeaconMovesEveryDirectoryNextToTheInstallation) {
+    TableSystem system;
+    system.RegisterEngine("D:\\Tree\\Verentis\\Bin\\x64\\Engine.dll");
+    system.files.insert("D:\\Tree\\Verentis\\" + beacon);
+    DirectoryGetter getter("2021 (64-bit)", system);
+    EXPECT_TRUE(getter.IsDevBuild());
+    EXPECT_EQ(getter.GetProgramsDirectory().View(), "D:\\Tree\\Verentis\\Bin\\x64\\Release\\");
+    EXPECT_EQ(getter.GetPublicDirectory().View(), "D:\\Tree\\VerentisPublic\\");
+    EXPECT_EQ(getter.GetCommonAppDataDirectory().View(), "D:\\Tree\\CommonAppData\\");
+    EXPECT_EQ(getter.GetLocalAppDataDirectory().View(), "D:\\Tree\\LocalAppData\\");
+    EXPECT_EQ(getter.GetDefaultConfigDirectory().View(), "D:\\Tree\\CommonAppData\\Cfg\\");
+    EXPECT_EQ(system.shellRequests, 0);
+}
+
+TEST(DevelopmentLayout, OverridesAreReadFromTheDevKey) {
+    TableSystem system;
+    system.RegisterEngine("D:\\Tree\\Verentis\\Bin\\x64\\Engine.dll");
+    system.files.insert("D:\\Tree\\Verentis\\" + beacon);
+    system.machine[{"Software\\Quillvane\\Verentis\\2021", "CfgLocation", true}] = "X:\\released";
+    system.machine[{"Software\\Quillvane\\Verentis\\2021dev", "CfgLocation", true}] = "X:\\development";
+    DirectoryGetter getter("2021", system);
+    EXPECT_EQ(getter.GetConfigDirectory("2021", true).View(), "X:\\development");
+}
+
+TEST(RegistryOverrides, AbsoluteValuesReplaceTheDirectoryInTheirView) {
+    TableSystem system;
+    system.machine[{"Software\\Quillvane\\Verentis\\A", "CfgLocation", false}] = "\\\\srv\\share\\cfg";
+    system.machine[{"Software\\Quillvane\\Verentis\\A", "CustomPublicLocation", true}] = "P:\\public";
+    DirectoryGetter getter("2021", system);
+    EXPECT_EQ(getter.GetConfigDirectory("A", false).View(), "\\\\srv\\share\\cfg");
+    EXPECT_EQ(getter.GetConfigDirectory("A", true).View(), getter.GetDefaultConfigDirectory().View());
+    EXPECT_EQ(getter.GetPublicDirectory("A", true).View(), "P:\\public");
+    EXPECT_EQ(getter.GetPublicDirectory("A", false).View(), getter.GetPublicDirectory().View());
+}
+
+TEST(RegistryOverrides, EmptyAndRelativeValuesAreIgnored) {
+    TableSystem system;
+    for (std::string value : {"", "relative\\cfg", "C:", "C:cfg", "/unix/style"}) {
+        system.machine[{"Software\\Quillvane\\Verentis\\B", "CfgLocation", true}] = value;
+        DirectoryGetter getter("2021", system);
+        EXPECT_EQ(getter.GetConfigDirectory("B", true).View(), "C:\\ProgramData\\Quillvane\\Verentis 2021\\Cfg\\")
+            << value;
+    }
+}
+
+TEST(Caching, AnswersStayUntilTheCacheIsCleared) {
+    TableSystem system;
+    DirectoryGetter getter("2021", system);
+    Path before = getter.GetConfigDirectory("C", true);
+    int shellRequests = system.shellRequests;
+    system.machine[{"Software\\Quillvane\\Verentis\\C", "CfgLocation", true}] = "Q:\\later";
+    EXPECT_EQ(getter.GetConfigDirectory("C", true).View(), before.View());
+    EXPECT_EQ(getter.GetCommonAppDataDirectory().View(), "C:\\ProgramData\\Quillvane\\Verentis 2021\\");
+    EXPECT_EQ(system.shellRequests, shellRequests);
+    // Another key or view is its own question, not the cached answer of the first.
+    system.machine[{"Software\\Quillvane\\Verentis\\D", "CfgLocation", true}] = "Q:\\other";
+    EXPECT_EQ(getter.GetConfigDirectory("D", true).View(), "Q:\\other");
+    getter.ClearCache();
+    EXPECT_EQ(getter.GetConfigDirectory("C", true).View(), "Q:\\later");
+}
+
+TEST(Caching, OneGetterPerExactVersionText) {
+    DirectoryGetter& first = GetDirectoryGetter("Version A");
+    EXPECT_EQ(&first, &GetDirectoryGetter("Version A"));
+    EXPECT_NE(&first, &GetDirectoryGetter("version a"));
+    EXPECT_EQ(first.GetVersion(), "Version A");
+}
+
+TEST(Failures, AShellFolderThatCannotBeFoundFailsTheRequest) {
+    class NoShell final : public DirectorySystem {
+    public:
+        std::optional<std::string> LoadedFrameworkModulePath() override { return std::nullopt; }
+        std::optional<std::string> ClassesRootDefaultValue(std::string_view) override { return std::nullopt; }
+        std::optional<std::string> MachineValue(std::string_view, std::string_view, bool) override { return std::nullopt; }
+        std::string ShellFolder(int) override { TE_RAISE(TE_PATH_NOT_FOUND, "NoShell::ShellFolder"); }
+        bool FileExists(std::string_view) override { return false; }
+    } system;
+    DirectoryGetter getter("2021", system);
+    try {
+        getter.GetConfigDirectory("E", true);
+        ADD_FAILURE() << "nothing was raised";
+    } catch (const TEException& caught) {
+        EXPECT_EQ(caught.GetErrorCode(), TE_PATH_NOT_FOUND);
+    }
+}
