@@ -1,0 +1,113 @@
+#include "framework/PeExports.h"
+
+#include <algorithm>
+#include <cstdint>
+#include <cstring>
+#include <set>
+#include <string>
+#include <vector>
+
+#include "framework/TEException.h"
+
+namespace sm {
+
+namespace {
+[[noreturn]] void RaiseBadFormat() {
+    TE_RAISE(TE_BAD_FILE_FORMAT, "ReadDLLExports", RaiseDetails{.source = "readdll"});
+}
+
+// Bounds-checked little-endian reads: every offset comes from the file and is trusted for nothing.
+class ImageReader {
+public:
+    explicit ImageReader(std::span<const unsigned char> bytes) : image(bytes) {}
+
+    std::uint64_t Size() const { return image.size(); }
+    void Require(std::uint64_t offset, std::uint64_t length) const {
+        if (offset > image.size() || length > image.size() - offset) RaiseBadFormat();
+    }
+    std::uint32_t U16(std::uint64_t offset) const {
+        Require(offset, 2);
+        return image[offset] | (image[offset + 1] << 8);
+    }
+    std::uint32_t U32(std::uint64_t offset) const {
+        Require(offset, 4);
+        return static_cast<std::uint32_t>(image[offset]) | (static_cast<std::uint32_t>(image[offset + 1]) << 8) |
+               (static_cast<std::uint32_t>(image[offset + 2]) << 16) |
+               (static_cast<std::uint32_t>(image[offset + 3]) << 24);
+    }
+    std::string_view Text(std::uint64_t offset) const {
+        Require(offset, 1);
+        const void* end = std::memchr(image.data() + offset, '\0', image.size() - offset);
+        if (!end) RaiseBadFormat();
+        return {reinterpret_cast<const char*>(image.data() + offset),
+                static_cast<std::size_t>(static_cast<const unsigned char*>(end) - (image.data() + offset))};
+    }
+
+private:
+    std::span<const unsigned char> image;
+};
+
+struct Section {
+    std::uint64_t virtualAddress, virtualSize, rawSize, rawOffset;
+};
+
+std::uint64_t RvaToOffset(const ImageReader& reader, const std::vector<Section>& sections, std::uint64_t rva) {
+    for (const Section& section : sections) {
+        std::uint64_t extent = std::max(section.virtualSize, section.rawSize);
+        if (rva >= section.virtualAddress && rva < section.virtualAddress + extent) {
+            std::uint64_t offset = rva - section.virtualAddress + section.rawOffset;
+            reader.Require(offset, 1);
+            return offset;
+        }
+    }
+    RaiseBadFormat();
+}
+
+bool IsExportNameStart(char first) {
+    return first == '_' || (first >= 'A' && first <= 'Z') || (first >= 'a' && first <= 'z');
+}
+}  // namespace
+
+void ReadExportNames(std::span<const unsigned char> image, StringVector& names) {
+    names.clear();
+    ImageReader reader(image);
+    if (reader.U16(0) != 0x5A4D) RaiseBadFormat();  // "MZ"
+    std::uint64_t peOffset = reader.U32(0x3C);
+    if (reader.U32(peOffset) != 0x00004550) RaiseBadFormat();  // "PE\0\0"
+    std::uint64_t coff = peOffset + 4;
+    std::uint32_t sectionCount = reader.U16(coff + 2);
+    std::uint32_t optionalSize = reader.U16(coff + 16);
+    std::uint64_t optional = coff + 20;
+    if (reader.U16(optional) != 0x20B) return;  // not a 64-bit image
+    reader.Require(optional, optionalSize);
+    if (optionalSize < 112 + 8) return;  // too short to hold an export directory entry
+    std::uint32_t directoryCount = reader.U32(optional + 108);
+    if (directoryCount < 1) return;
+    std::uint32_t exportRva = reader.U32(optional + 112);
+    if (exportRva == 0) return;
+
+    std::vector<Section> sections;
+    std::uint64_t table = optional + optionalSize;
+    reader.Require(table, static_cast<std::uint64_t>(sectionCount) * 40);
+    for (std::uint32_t index = 0; index < sectionCount; ++index) {
+        std::uint64_t entry = table + static_cast<std::uint64_t>(index) * 40;
+        sections.push_back({reader.U32(entry + 12), reader.U32(entry + 8), reader.U32(entry + 16), reader.U32(entry + 20)});
+    }
+
+    std::uint64_t directory = RvaToOffset(reader, sections, exportRva);
+    reader.Require(directory, 40);
+    std::uint64_t nameCount = reader.U32(directory + 24);
+    std::uint32_t namesRva = reader.U32(directory + 32);
+    if (nameCount == 0) return;
+    std::uint64_t nameTable = RvaToOffset(reader, sections, namesRva);
+    reader.Require(nameTable, nameCount * 4);
+
+    std::set<std::string, std::less<>> unique;
+    for (std::uint64_t index = 0; index < nameCount; ++index) {
+        std::string_view name = reader.Text(RvaToOffset(reader, sections, reader.U32(nameTable + index * 4)));
+        if (!name.empty() && IsExportNameStart(name[0])) unique.emplace(name);
+    }
+    for (const auto& name : unique) names.emplace_back(std::string_view(name));
+}
+
+}  // namespace sm

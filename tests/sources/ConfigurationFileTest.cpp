@@ -1,0 +1,220 @@
+// The configuration file on a real file system under Wine: regeneration from driver images,
+// re-reading by write time, and what the VXIplug&play source makes of it. The directory comes from
+// the VXIPNPPATH environment variable, resolved once per process.
+#include <gtest/gtest.h>
+#include <windows.h>
+
+#include <fstream>
+#include <iterator>
+#include <string>
+
+#include "framework/PeExports.h"
+#include "framework/TEException.h"
+#include "sources/ConfigurationFile.h"
+#include "sources/ConfigurationFileHeader.h"
+#include "sources/VxipnpInfo.h"
+
+using namespace sm;
+
+namespace {
+const std::string root = [] {
+    char temp[MAX_PATH];
+    ::GetTempPathA(MAX_PATH, temp);
+    std::string folder = std::string(temp) + "SessionMgrConfigurationTest";
+    ::SetEnvironmentVariableA("VXIPNPPATH", folder.c_str());
+    return folder;
+}();
+const std::string platform = root + "\\Win64";
+const std::string file = platform + "\\QVSessionMgr.ini";
+
+void RemoveTree(const std::string& path) {
+    WIN32_FIND_DATAA data;
+    HANDLE find = ::FindFirstFileA((path + "\\*").c_str(), &data);
+    if (find != INVALID_HANDLE_VALUE) {
+        do {
+            std::string name = data.cFileName;
+            if (name == "." || name == "..") continue;
+            std::string child = path + "\\" + name;
+            if (data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY)
+                RemoveTree(child);
+            else
+                ::DeleteFileA(child.c_str());
+        } while (::FindNextFileA(find, &data));
+        ::FindClose(find);
+    }
+    ::RemoveDirectoryA(path.c_str());
+}
+
+void Copy(const char* from, const std::string& to) { ASSERT_TRUE(::CopyFileA(from, to.c_str(), FALSE)) << to; }
+
+std::string ReadBytes(const std::string& path) {
+    std::ifstream in(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
+}
+
+void WriteBytes(const std::string& path, const std::string& text) {
+    std::ofstream out(path, std::ios::binary | std::ios::trunc);
+    out << text;
+}
+
+std::string WithCrLf(std::string text) {
+    std::string converted;
+    for (char c : text) {
+        if (c == '\n') converted += '\r';
+        converted += c;
+    }
+    return converted;
+}
+
+void SetWriteTime(const std::string& path, std::int64_t offsetSeconds) {
+    HANDLE handle = ::CreateFileA(path.c_str(), FILE_WRITE_ATTRIBUTES, FILE_SHARE_READ, nullptr, OPEN_EXISTING, 0, nullptr);
+    ASSERT_NE(handle, INVALID_HANDLE_VALUE);
+    FILETIME now;
+    ::GetSystemTimeAsFileTime(&now);
+    ULARGE_INTEGER value{{now.dwLowDateTime, now.dwHighDateTime}};
+    value.QuadPart += offsetSeconds * 10000000ll;
+    FILETIME moved{value.LowPart, value.HighPart};
+    ::SetFileTime(handle, nullptr, nullptr, &moved);
+    ::CloseHandle(handle);
+}
+
+std::int32_t CurrentGeneration() {
+    std::lock_guard guard(ConfigurationLock());
+    std::int32_t generation = -1;
+    GetConfiguration(generation);
+    return generation;
+}
+
+// Runs in declaration order: the directory is resolved once for the process, so each step sets up
+// the files it needs inside it.
+class ConfigurationFile : public ::testing::Test {};
+}  // namespace
+
+TEST_F(ConfigurationFile, MissingPlatformDirectoryLeavesTheConfigurationEmptyAndIsRetried) {
+    RemoveTree(root);
+    ASSERT_TRUE(::CreateDirectoryA(root.c_str(), nullptr));
+    EXPECT_EQ(CurrentGeneration(), 0);
+    EXPECT_FALSE(::GetFileAttributesA(file.c_str()) != INVALID_FILE_ATTRIBUTES);
+    Path directory;
+    ASSERT_TRUE(GetPlatformDirectory(directory));
+    EXPECT_EQ(std::string(directory.View()), platform);
+
+    ASSERT_TRUE(::CreateDirectoryA(platform.c_str(), nullptr));
+    EXPECT_EQ(CurrentGeneration(), 1);
+    EXPECT_EQ(ReadBytes(file), WithCrLf(std::string(configurationFileHeader) + "\n;; NO VXIPNP drivers found!\n"));
+}
+
+TEST_F(ConfigurationFile, RegenerationWritesOneSectionPerDetectedDriver) {
+    std::int32_t before = CurrentGeneration();
+    ::DeleteFileA(file.c_str());
+    Copy(SCAN_STANDARD, platform + "\\abc.dll");
+    Copy(SCAN_IVISPECIFIC, platform + "\\ivi.dll");
+    Copy(SCAN_OTHERCASE, platform + "\\odd.dll");
+    Copy(SCAN_RESETOTHERCASE, platform + "\\rst.dll");
+    WriteBytes(platform + "\\junk.dll", "not an image");
+    ::CreateDirectoryA((platform + "\\sub1").c_str(), nullptr);
+    ::CreateDirectoryA((platform + "\\sub2").c_str(), nullptr);
+    Copy(SCAN_DUPLICATE, platform + "\\sub1\\dup1.dll");
+    Copy(SCAN_DUPLICATE, platform + "\\sub2\\dup2.dll");
+
+    VxipnpInfo source;
+    EXPECT_EQ(source.GetConfigurationLists(), before + 1);
+    // Fresh sections have an empty resource, so no virtual instrument counts yet.
+    EXPECT_TRUE(source.VirtualInstruments().empty());
+
+    std::string written = ReadBytes(file);
+    std::string header = WithCrLf(configurationFileHeader);
+    ASSERT_EQ(written.substr(0, header.size()), header);
+    IniObj reread;
+    reread.ReadFile(file);
+    std::vector<std::string> sections;
+    for (const auto& section : reread.GetSections()) sections.push_back(section.name);
+    // Drivers in the reverse of the listing order (files by name, then subfolders); a prefix seen
+    // twice keeps its first place and the items of the one put later.
+    EXPECT_EQ(sections, (std::vector<std::string>{"VISA Logical Names", "VXIPNP Logical Names", "VPPVInstr->dup",
+                                                  "VPPVInstr->odd", "VPPVInstr->abc"}));
+    DynamicString value;
+    ASSERT_TRUE(reread.Get("VPPVInstr->dup", "ModulePath", value));
+    EXPECT_EQ(std::string(value.View()), platform + "\\sub1\\dup1.dll");
+    ASSERT_TRUE(reread.Get("VPPVInstr->odd", "Prefix", value));
+    EXPECT_EQ(std::string(value.View()), "odd");
+    ASSERT_TRUE(reread.Get("VPPVInstr->abc", "Resource", value));
+    EXPECT_EQ(std::string(value.View()), "");
+    ASSERT_NE(reread.FindItem("VPPVInstr->abc", "IDQuery"), nullptr);
+    EXPECT_EQ(reread.FindItem("VPPVInstr->abc", "IDQuery")->value, "True");
+    EXPECT_FALSE(reread.FindItem("VPPVInstr->abc", "IDQuery")->quoted);
+    EXPECT_TRUE(reread.FindItem("VPPVInstr->abc", "ModulePath")->quoted);
+}
+
+TEST_F(ConfigurationFile, NewerWriteTimeIsReadAgainAndOlderIsNot) {
+    std::string text = ReadBytes(file);
+    std::size_t resource = text.find("Resource = \"\"", text.find("[VPPVInstr->abc]"));
+    ASSERT_NE(resource, std::string::npos);
+    text.replace(resource, 13, "Resource = \"GPIB0::14::INSTR\"");
+    // The header's comments show the same section line; the real one starts a line of its own.
+    std::size_t logicalNames = text.find("\r\n[VXIPNP Logical Names]\r\n");
+    ASSERT_NE(logicalNames, std::string::npos);
+    text.insert(logicalNames + 26, "DMM1 = \"vppvinstr->ABC\"\r\n");
+    std::int32_t before = CurrentGeneration();
+    WriteBytes(file, text);
+    SetWriteTime(file, -3600);
+    EXPECT_EQ(CurrentGeneration(), before);
+    SetWriteTime(file, 3600);
+    EXPECT_EQ(CurrentGeneration(), before + 1);
+
+    VxipnpInfo source;
+    source.GetConfigurationLists();
+    ASSERT_EQ(source.VirtualInstruments().size(), 1u);
+    VxipnpVInstr found;
+    ASSERT_TRUE(source.FindVInstr("dmm1", found));
+    EXPECT_EQ(std::string(found.name.View()), "abc");
+    EXPECT_EQ(std::string(found.resource.View()), "GPIB0::14::INSTR");
+    EXPECT_EQ(std::string(found.modulePath.View()), platform + "\\abc.dll");
+
+    StringVector names;
+    source.ListNames("?", 3, {}, names);
+    ASSERT_EQ(names.size(), 2u);
+    EXPECT_EQ(std::string(names[0].View()), "abc");
+    EXPECT_EQ(std::string(names[1].View()), "DMM1");
+    source.ListNames("?", 3, {DynamicString("SpecificPrefix = ABC")}, names);
+    EXPECT_EQ(names.size(), 2u);
+    source.ListNames("?", 3, {DynamicString("SpecificPrefix = other")}, names);
+    EXPECT_TRUE(names.empty());
+}
+
+TEST_F(ConfigurationFile, StateDescriptionShowsTheFileAndItsInstruments) {
+    VxipnpInfo source;
+    DynamicString text;
+    source.AppendStateDescription(text);
+    std::string described(text.View());
+    EXPECT_EQ(described.rfind("VXIPNP Configuration:\n   Session Manager configuration file: " + file +
+                                  ", Number of sections: 5\nVXIPNP directory: " + root +
+                                  "\nVXIPNP directory from registry: \nVXIPNP directory from PATH: " + root +
+                                  "\nVXIPNP platform directory: " + platform + "\n\nFile Contents:\n",
+                              0),
+              0u)
+        << described;
+    EXPECT_NE(described.find("   Number of virtual instruments = 1\n      Virtual Instrument # = 0\n"
+                             "         name list (2):abc (VirtualInstrumentName), DMM1 (LogicalName)\n"
+                             "         modulePath '" +
+                             platform + "\\abc.dll'\n         prefix 'abc'\n         resource 'GPIB0::14::INSTR'\n\n\n"),
+              std::string::npos)
+        << described;
+}
+
+TEST(DriverImages, ExportNamesOfRealImages) {
+    StringVector names;
+    ReadDLLExports(SCAN_OTHERCASE, names);
+    std::vector<std::string> plain;
+    for (const auto& name : names) plain.emplace_back(name.View());
+    EXPECT_EQ(plain, (std::vector<std::string>{"ExportOnlyDriverEntry", "odd_ErrorMessage", "odd_ErrorQuery",
+                                               "odd_RevisionQuery", "odd_SelfTest", "odd_close", "odd_init",
+                                               "odd_reset"}));
+    try {
+        ReadDLLExports(root + "\\no such file.dll", names);
+        ADD_FAILURE() << "a missing file raised nothing";
+    } catch (const TEException& error) {
+        EXPECT_EQ(error.GetErrorCode(), TE_FILE_NOT_FOUND);
+        EXPECT_EQ(error.GetApiErrorCode(), 2);
+    }
+}
