@@ -1,0 +1,71 @@
+// The VXIplug&play directory from the registry: it wins over the environment, and the file is
+// regenerated in its platform folder.
+#include <gtest/gtest.h>
+#include <windows.h>
+
+#include <fstream>
+#include <iterator>
+#include <string>
+
+#include "sources/ConfigurationFile.h"
+#include "sources/ConfigurationFileHeader.h"
+#include "sources/VxipnpInfo.h"
+
+using namespace sm;
+
+namespace {
+constexpr const char* vxipnpKey = "SOFTWARE\\VXIPNP_Alliance\\VXIPNP\\CurrentVersion";
+
+std::string TempFolder(const char* name) {
+    char temp[MAX_PATH];
+    ::GetTempPathA(MAX_PATH, temp);
+    std::string folder = std::string(temp) + name;
+    ::CreateDirectoryA(folder.c_str(), nullptr);
+    return folder;
+}
+
+class RegistryDirectory : public ::testing::Test {
+protected:
+    static void SetUpTestSuite() {
+        registryFolder = TempFolder("SessionMgrRegistryVxipnp");
+        environmentFolder = TempFolder("SessionMgrEnvironmentVxipnp");
+        ::CreateDirectoryA((registryFolder + "\\Win64").c_str(), nullptr);
+        ::DeleteFileA((registryFolder + "\\Win64\\QVSessionMgr.ini").c_str());
+        HKEY key = nullptr;
+        ASSERT_EQ(::RegCreateKeyExA(HKEY_LOCAL_MACHINE, vxipnpKey, 0, nullptr, 0, KEY_WRITE, nullptr, &key, nullptr),
+                  ERROR_SUCCESS);
+        ::RegSetValueExA(key, "VXIPNPPATH", 0, REG_SZ, reinterpret_cast<const BYTE*>(registryFolder.c_str()),
+                         static_cast<DWORD>(registryFolder.size() + 1));
+        ::RegCloseKey(key);
+        ::SetEnvironmentVariableA("VXIPNPPATH", environmentFolder.c_str());
+    }
+    static void TearDownTestSuite() { ::RegDeleteKeyValueA(HKEY_LOCAL_MACHINE, vxipnpKey, "VXIPNPPATH"); }
+    static inline std::string registryFolder, environmentFolder;
+};
+}  // namespace
+
+TEST_F(RegistryDirectory, WinsOverTheEnvironmentAndReceivesTheFile) {
+    Path directory;
+    ASSERT_TRUE(GetVxipnpDirectory(directory));
+    EXPECT_EQ(std::string(directory.View()), registryFolder);
+
+    VxipnpInfo source;
+    EXPECT_EQ(source.GetConfigurationLists(), 1);
+    std::ifstream written(registryFolder + "\\Win64\\QVSessionMgr.ini", std::ios::binary);
+    std::string text{std::istreambuf_iterator<char>(written), std::istreambuf_iterator<char>()};
+    EXPECT_NE(text.find(";; NO VXIPNP drivers found!\r\n"), std::string::npos);
+
+    DynamicString state;
+    source.AppendStateDescription(state);
+    EXPECT_NE(std::string(state.View()).find("VXIPNP directory from registry: " + registryFolder +
+                                             "\nVXIPNP directory from PATH: " + environmentFolder + "\n"),
+              std::string::npos)
+        << state.GetText();
+}
+
+TEST_F(RegistryDirectory, TheResolvedDirectoryIsKeptForTheProcess) {
+    ::RegDeleteKeyValueA(HKEY_LOCAL_MACHINE, vxipnpKey, "VXIPNPPATH");
+    Path directory;
+    ASSERT_TRUE(GetVxipnpDirectory(directory));
+    EXPECT_EQ(std::string(directory.View()), registryFolder);
+}
