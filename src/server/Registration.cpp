@@ -90,6 +90,25 @@ HRESULT UnregisterClass(const ObjectMapEntry& entry) {
     return S_OK;
 }
 
+// The type library is filed under its own locale (0x409). Wine's type-library marshaler looks a
+// library up under the neutral locale only, so without a neutral entry our interfaces cannot be
+// marshaled between apartments and every early-bound call from a single-threaded apartment fails
+// with E_NOINTERFACE. The neutral entry names the same file.
+std::string NeutralLocaleKey() { return "TypeLib\\" + GuidText(LIBID_SM) + "\\1.0\\0"; }
+
+HRESULT RegisterNeutralLocale() {
+    UniqueBstr path;
+    if (HRESULT found = ::QueryPathOfRegTypeLib(LIBID_SM, 1, 0, 0x409, path.Put()); FAILED(found)) return found;
+    std::wstring platformKey;
+    for (char c : NeutralLocaleKey() + "\\win64") platformKey += static_cast<wchar_t>(c);
+    UniqueRegistryKey key;
+    LSTATUS status = ::RegCreateKeyExW(HKEY_CLASSES_ROOT, platformKey.c_str(), 0, nullptr, 0, KEY_WRITE, nullptr,
+                                       key.Put(), nullptr);
+    if (status != ERROR_SUCCESS) return Check(status);
+    auto bytes = static_cast<DWORD>((::SysStringLen(path.Get()) + 1) * sizeof(wchar_t));
+    return Check(::RegSetValueExW(key.Get(), nullptr, 0, REG_SZ, reinterpret_cast<const BYTE*>(path.Get()), bytes));
+}
+
 }  // namespace
 }  // namespace sm
 
@@ -99,11 +118,15 @@ extern "C" HRESULT STDAPICALLTYPE DllRegisterServer() {
     for (const ObjectMapEntry& entry : GetObjectMap())
         if (HRESULT result = RegisterClass(entry); FAILED(result)) return result;
     ComPtr<ITypeLib> library;
-    return ::LoadTypeLibEx(GetOwnModulePath(), REGKIND_REGISTER, library.Put());
+    if (HRESULT result = ::LoadTypeLibEx(GetOwnModulePath(), REGKIND_REGISTER, library.Put()); FAILED(result))
+        return result;
+    return RegisterNeutralLocale();
 }
 
 extern "C" HRESULT STDAPICALLTYPE DllUnregisterServer() {
     for (const ObjectMapEntry& entry : GetObjectMap())
         if (HRESULT result = UnregisterClass(entry); FAILED(result)) return result;
+    // Removed first: the library's version key goes away only when no locale is left under it.
+    if (HRESULT result = Check(DeleteTree(HKEY_CLASSES_ROOT, NeutralLocaleKey())); FAILED(result)) return result;
     return ::UnRegisterTypeLib(LIBID_SM, 1, 0, 0x409, SYS_WIN64);
 }

@@ -220,6 +220,10 @@ TEST_F(Registration, WritesEveryKeyOfTheTable) {
     EXPECT_EQ(attributes->wMajorVerNum, 1);
     EXPECT_EQ(attributes->wMinorVerNum, 0);
     library->ReleaseTLibAttr(attributes);
+    // Also filed under the neutral locale, where Wine's marshaler looks for it, naming the same file.
+    const std::string versionKey = std::string("TypeLib\\") + libraryId + "\\1.0";
+    ASSERT_TRUE(ReadString(versionKey + "\\409\\win64").has_value());
+    EXPECT_EQ(ReadString(versionKey + "\\0\\win64"), ReadString(versionKey + "\\409\\win64"));
     for (const char* interfaceId : interfaceIds) {
         SCOPED_TRACE(interfaceId);
         EXPECT_EQ(ReadString(std::string("Interface\\") + interfaceId + "\\ProxyStubClsid32"), automationMarshaler);
