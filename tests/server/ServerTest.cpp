@@ -154,3 +154,13 @@ TEST(ErrorInfo, ReachesLateBoundClientsThroughExcepInfo) {
     ::SysFreeString(exception.bstrSource);
     ::SysFreeString(exception.bstrHelpFile);
 }
+
+TEST(ModuleResources, CarryTheModuleNameAndTheTypeLibrary) {
+    auto manager = CreateManager();  // loads the DLL
+    HMODULE module = ::GetModuleHandleA("SessionMgr.dll");
+    ASSERT_NE(module, nullptr);
+    char name[64] = {};
+    ASSERT_GT(::LoadStringA(module, 100, name, sizeof name), 0);
+    EXPECT_STREQ(name, "SessionMgr");
+    EXPECT_NE(::FindResourceA(module, MAKEINTRESOURCEA(1), "TYPELIB"), nullptr);
+}
