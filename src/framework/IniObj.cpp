@@ -401,7 +401,10 @@ public:
     Writer(std::string& out, bool lfOnly) : out(out), lineEnd(lfOnly ? "\n" : "\r\n") {}
 
     void Section(const SectionEntry& section) {
-        line.assign("[").append(section.name).append("]");
+        line.clear();
+        line += '[';
+        line += section.name;
+        line += ']';
         ParsedLine parsed = CheckedParse();
         if (parsed.kind != LineKind::Header || parsed.name != section.name) RaiseUnwritable(section.name, section.name);
         Emit();
@@ -499,7 +502,11 @@ private:
 bool HasLineBreak(std::string_view text) { return text.find_first_of(std::string_view("\r\n\0", 3)) != std::string_view::npos; }
 
 void CheckSectionName(std::string_view name, const TextRules& rules) {
-    std::string header = "[" + std::string(name) + "]";
+    std::string header;
+    header.reserve(name.size() + 2);
+    header += '[';
+    header += name;
+    header += ']';
     ParsedLine parsed = ParseLine(header, rules);
     if (HasLineBreak(name) || parsed.kind != LineKind::Header || parsed.name != name)
         TE_RAISE(TE_INVALID_OR_OUT_OF_RANGE, "IniObj::Put", DescribedMessage("INI_INVALID_SECTION_NAME", {name}));
