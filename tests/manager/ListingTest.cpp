@@ -194,6 +194,7 @@ protected:
     }
     void TearDown() override {
         for (const wchar_t* category : {L"IVI", L"DAQ", L"VISA", L"VXIPNP", L"CUSTOM"}) Hide(category, false);
+        EXPECT_EQ(manager->put_InExternalProcess(VARIANT_FALSE), S_OK);
         TakeErrorInfo();
     }
 
@@ -383,6 +384,22 @@ TEST_F(Listing, OptionsAndFiltersReachTheSource) {
               configuredNames);
     EXPECT_EQ(NamesBothWays(L"VXIPNP", logicalAndVirtual, L"abc"), Texts{});
     EXPECT_EQ(NamesBothWays(L"VXIPNP", logicalAndVirtual, L"SpecificPrefix = hp34401a"), Texts{});
+}
+
+TEST_F(Listing, ExternalManagerMarksNamesListedForThePrefixedCategory) {
+    // In the shared external process prefixed requests are served here; names asked for with the
+    // 64-bit prefix come back with it, so that they lead back to this manager.
+    ASSERT_EQ(manager->put_InExternalProcess(VARIANT_TRUE), S_OK);
+    EXPECT_EQ(NamesBothWays(L"*VXIPNP"), (Texts{"*MyScope", "*Scope1"}));
+    EXPECT_EQ(NamesBothWays(L" *vxipnp ", logicalAndVirtual | IncludeCategoryPrefix),
+              (Texts{"*VXIPNP::MyScope", "*VXIPNP::Scope1"}));
+    EXPECT_EQ(NamesBothWays(L"VXIPNP"), configuredNames);
+    // The 32-bit switch prefix marks nothing; category lists are never marked.
+    EXPECT_EQ(NamesBothWays(L"32*RQ"), NamesBothWays(L"RQ"));
+    EXPECT_EQ(CategoriesBothWays(L"*"), (Texts{"IVI", "VISA", "VXIPNP", "CUSTOM"}));
+    ExpectNamesError(L"*FOO", "FOO");
+    auto session = GetSession(manager.Get(), L"CUSTOM::Shared");
+    EXPECT_EQ(SessionsBothWays(L"*CUSTOM"), IdentitiesOf({session.Get()}));
 }
 
 // ---- GetSessions --------------------------------------------------------------------------------
