@@ -128,5 +128,9 @@ extern "C" HRESULT STDAPICALLTYPE DllUnregisterServer() {
         if (HRESULT result = UnregisterClass(entry); FAILED(result)) return result;
     // Removed first: the library's version key goes away only when no locale is left under it.
     if (HRESULT result = Check(DeleteTree(HKEY_CLASSES_ROOT, NeutralLocaleKey())); FAILED(result)) return result;
+    // An installer that unregisters twice must not fail the second time: a library that is no
+    // longer registered is already where unregistering would put it.
+    UniqueBstr registered;
+    if (FAILED(::QueryPathOfRegTypeLib(LIBID_SM, 1, 0, 0x409, registered.Put()))) return S_OK;
     return ::UnRegisterTypeLib(LIBID_SM, 1, 0, 0x409, SYS_WIN64);
 }

@@ -167,6 +167,13 @@ TEST_F(Registration, UnregisterRemovesEveryClassAndTheTypeLibrary) {
               REGDB_E_CLASSNOTREG);
 }
 
+TEST_F(Registration, UnregisteringTwiceSucceeds) {
+    ASSERT_EQ(registerServer(), S_OK);
+    ASSERT_EQ(unregisterServer(), S_OK);
+    EXPECT_EQ(unregisterServer(), S_OK);
+    EXPECT_FALSE(KeyExists(std::string("TypeLib\\") + libraryId));
+}
+
 TEST_F(Registration, WritesEveryKeyOfTheTable) {
     ASSERT_EQ(unregisterServer(), S_OK);
     ASSERT_EQ(registerServer(), S_OK);

@@ -11,6 +11,7 @@ mkdir -p "$work"
 register_again() { "$wine_exec" regsvr32 /s "$dll" >"$work/reregister.out" 2>&1; }
 fail() {
   echo "FAIL: $*"
+  for output in "$work"/*.out; do echo "--- $output"; cat "$output"; done
   register_again
   exit 1
 }
