@@ -153,7 +153,8 @@ bool String::ReplaceFirst(std::string_view pattern, std::string_view replacement
 }
 
 void String::ReplaceArg(int argumentNumber, std::string_view value) {
-    std::string placeholder = "%" + std::to_string(argumentNumber);
+    std::string placeholder(1, '%');
+    placeholder += std::to_string(argumentNumber);
     if (!ReplaceFirst(placeholder, value, false)) HandleMissingFormatArgument(placeholder, value);
 }
 

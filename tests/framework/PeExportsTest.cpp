@@ -153,7 +153,6 @@ TEST(ExportNames, EveryOutOfFileReferenceIsCaught) {
     ExpectBadFormat(nameOutside);
 
     // A name that runs to the end of the file without its terminator.
-    auto truncated = good;
-    truncated.pop_back();
+    std::vector<unsigned char> truncated(good.begin(), good.end() - 1);
     ExpectBadFormat(truncated);
 }
