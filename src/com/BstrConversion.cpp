@@ -61,6 +61,12 @@ std::string WideToMultiByte(const wchar_t* text, std::size_t length) {
 
 void Assign(String& target, BSTR text) { target.Assign(std::string_view(BstrToMultiByte(text))); }
 
+DynamicString TrimmedString(BSTR text) {
+    DynamicString trimmed(std::string_view(BstrToMultiByte(text)));
+    trimmed.Trim();
+    return trimmed;
+}
+
 SAFEARRAY* CreateSafeArray(const StringVector& strings) {
     if (strings.size() > std::numeric_limits<ULONG>::max()) TE_RAISE(TE_PROGRAM_ERROR, "StringVector::CreateSafeArray");
     UniqueSafeArray array(::SafeArrayCreateVector(VT_BSTR, 0, static_cast<ULONG>(strings.size())));

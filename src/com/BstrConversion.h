@@ -20,6 +20,8 @@ inline BSTR AllocSysString(const String& text) { return AllocSysString(text.View
 std::string WideToMultiByte(const wchar_t* text, std::size_t length);
 inline std::string BstrToMultiByte(BSTR text) { return WideToMultiByte(text, text ? ::SysStringLen(text) : 0); }
 void Assign(String& target, BSTR text);
+// The text of a BSTR argument without leading and trailing white space, as names are compared.
+DynamicString TrimmedString(BSTR text);
 
 // BSTR converted from system-ANSI text (error descriptions).
 BSTR AnsiToBstr(std::string_view text);

@@ -56,6 +56,11 @@ int Compare(std::string_view left, std::string_view right, bool ignoreCase) {
     return 0;
 }
 
+bool BeginsWith(std::string_view text, std::string_view prefix, bool ignoreCase) {
+    std::size_t bytes = BytesOfChars(text, CharCount(prefix));
+    return Compare(text.substr(0, bytes), prefix, ignoreCase) == 0;
+}
+
 std::string ToLower(std::string_view text) {
     std::string lowered(text);
     for (std::size_t offset = 0; offset < lowered.size();) {

@@ -26,6 +26,9 @@ std::size_t WholeCharPrefix(std::string_view text, std::size_t maxBytes);
 // Like _mbscmp/_mbsicmp: negative, zero or positive, comparing characters as code values.
 int Compare(std::string_view left, std::string_view right, bool ignoreCase);
 
+// True when text begins with prefix, compared character by character.
+bool BeginsWith(std::string_view text, std::string_view prefix, bool ignoreCase);
+
 // Lower-cases every single-byte character, leaving double-byte characters alone (as _mbslwr does).
 std::string ToLower(std::string_view text);
 

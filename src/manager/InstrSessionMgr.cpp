@@ -12,19 +12,6 @@
 
 namespace sm {
 
-namespace {
-DynamicString Trimmed(BSTR text) {
-    DynamicString trimmed(BstrToMultiByte(text));
-    trimmed.Trim();
-    return trimmed;
-}
-
-bool BeginsWithNoCase(std::string_view text, std::string_view prefix) {
-    std::size_t bytes = multibyte::BytesOfChars(text, multibyte::CharCount(prefix));
-    return multibyte::Compare(text.substr(0, bytes), prefix, true) == 0;
-}
-}  // namespace
-
 CInstrSessionMgr::CInstrSessionMgr() {
     for (unsigned frequency = 1000; frequency < 3000; frequency += 200) LifeTimeAlert(frequency, 10);
 }
@@ -113,7 +100,7 @@ STDMETHODIMP CInstrSessionMgr::GetInstrSession(BSTR name, VARIANT_BOOL newSessio
     if (!session) return E_POINTER;
     *session = nullptr;
     return ManagerCall([&]() -> HRESULT {
-        DynamicString text = Trimmed(name);
+        DynamicString text = TrimmedString(name);
         if (ShouldForward(text.View()))
             return GetExternalMgr(ExternalProcessIndex(text.View()))->GetInstrSession(name, newSession, session);
         StripExternalPrefix(text);
@@ -175,7 +162,7 @@ bool CInstrSessionMgr::CreateInstrSession(std::string_view category, std::string
     if (is(CategoryVISA)) {
         VisaEntry entry;
         bool found = visaInfo.FindEntry(name, entry);
-        if (!found && BeginsWithNoCase(name, "TCPIP")) found = visaInfo.ParseResource(name, entry);
+        if (!found && multibyte::BeginsWith(name, "TCPIP", true)) found = visaInfo.ParseResource(name, entry);
         if (!found) found = visaInfo.FindLogicalName(name, entry);
         if (!found) return false;
         // VISA sessions come with the VISA source; until then no resource is ever found.

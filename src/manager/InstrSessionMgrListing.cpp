@@ -7,12 +7,6 @@
 namespace sm {
 
 namespace {
-DynamicString Trimmed(BSTR text) {
-    DynamicString trimmed(BstrToMultiByte(text));
-    trimmed.Trim();
-    return trimmed;
-}
-
 [[noreturn]] void RaiseCategoryError(std::string_view category, const char* function) {
     DynamicString message("'");
     message.Append(category).Append("' ").Append("is not a driver session category");
@@ -31,7 +25,7 @@ STDMETHODIMP CInstrSessionMgr::GetNames(BSTR category, GetNamesOptions flags, BS
     if (!names) return E_POINTER;
     *names = nullptr;
     return ManagerCall([&]() -> HRESULT {
-        DynamicString text = Trimmed(category);
+        DynamicString text = TrimmedString(category);
         if (ShouldForward(text.View()))
             return GetExternalMgr(ExternalProcessIndex(text.View()))->GetNames(category, flags, filter, names);
         bool starPrefix = HasExternalPrefix(text.View()) && ExternalProcessIndex(text.View()) == 0;
@@ -77,7 +71,7 @@ STDMETHODIMP CInstrSessionMgr::GetSessions(BSTR category, SAFEARRAY** result) {
     if (!result) return E_POINTER;
     *result = nullptr;
     return ManagerCall([&]() -> HRESULT {
-        DynamicString text = Trimmed(category);
+        DynamicString text = TrimmedString(category);
         if (ShouldForward(text.View()))
             return GetExternalMgr(ExternalProcessIndex(text.View()))->GetSessions(category, result);
         StripExternalPrefix(text);
@@ -113,7 +107,7 @@ STDMETHODIMP CInstrSessionMgr::GetCategories(BSTR baseCategory, SAFEARRAY** resu
     if (!result) return E_POINTER;
     *result = nullptr;
     return ManagerCall([&]() -> HRESULT {
-        DynamicString text = Trimmed(baseCategory);
+        DynamicString text = TrimmedString(baseCategory);
         if (ShouldForward(text.View()))
             return GetExternalMgr(ExternalProcessIndex(text.View()))->GetCategories(baseCategory, result);
         StripExternalPrefix(text);
@@ -140,7 +134,7 @@ void CInstrSessionMgr::GetCategoryNames(std::string_view argument, StringVector&
 
 STDMETHODIMP CInstrSessionMgr::HideCategory(BSTR category, VARIANT_BOOL hide) {
     return ManagerCall([&] {
-        DynamicString text = Trimmed(category);
+        DynamicString text = TrimmedString(category);
         StripExternalPrefix(text);
         bool* flags[] = {&iviHidden, &daqHidden, &visaHidden, &vxipnpHidden, &customHidden};
         std::string_view tokens[] = {CategoryIVI, CategoryDAQ, CategoryVISA, CategoryVXIPNP, CategoryCUSTOM};

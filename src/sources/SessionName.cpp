@@ -11,13 +11,8 @@ bool SameCategory(std::string_view left, std::string_view right) {
 }
 
 namespace {
-bool BeginsWithNoCase(std::string_view text, std::string_view prefix) {
-    std::size_t bytes = multibyte::BytesOfChars(text, multibyte::CharCount(prefix));
-    return multibyte::Compare(text.substr(0, bytes), prefix, true) == 0;
-}
-
 bool IsThirtyTwoBitRoute(std::string_view text) {
-    return multibyte::Compare(text, "32*RQ", true) == 0 || BeginsWithNoCase(text, "32*RQ::");
+    return multibyte::Compare(text, "32*RQ", true) == 0 || multibyte::BeginsWith(text, "32*RQ::", true);
 }
 }  // namespace
 

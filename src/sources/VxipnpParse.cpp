@@ -8,10 +8,6 @@ namespace sm {
 namespace {
 constexpr std::string_view vinstrPrefix = "VPPVInstr->";
 
-bool BeginsWithNoCase(std::string_view text, std::string_view prefix) {
-    return text.size() >= prefix.size() && multibyte::Compare(text.substr(0, prefix.size()), prefix, true) == 0;
-}
-
 void ReadLogicalNames(const IniObj& configuration, std::string_view section, LogicalNameList& list) {
     const SectionEntry* found = configuration.FindSection(section);
     if (!found) return;
@@ -42,7 +38,7 @@ void VxipnpInfo::Parse(const IniObj& configuration) {
     ReadLogicalNames(configuration, "VISA Logical Names", visaLogicalNames);
 
     for (const SectionEntry& section : configuration.GetSections()) {
-        if (!BeginsWithNoCase(section.name, vinstrPrefix)) continue;
+        if (!multibyte::BeginsWith(section.name, vinstrPrefix, true)) continue;
         VxipnpVInstr instrument;
         instrument.name.Assign(std::string_view(section.name).substr(vinstrPrefix.size()));
         if (!configuration.Get(section.name, "ModulePath", instrument.modulePath)) continue;

@@ -2,6 +2,8 @@
 // what would not read back), values, files, and write-read round trips over generated documents.
 #include <gtest/gtest.h>
 
+#include "DoubleByteCodePage.h"
+
 #include <algorithm>
 #include <chrono>
 #include <cstdint>
@@ -62,15 +64,7 @@ std::string Describe(const IniObj& ini) {
     return picture;
 }
 
-class IniDoubleByte : public ::testing::Test {
-protected:
-    void SetUp() override {
-        previous = GetMultiByteCodePage();
-        ASSERT_TRUE(SetMultiByteCodePage(932));
-    }
-    void TearDown() override { SetMultiByteCodePage(previous); }
-    int previous = 0;
-};
+using IniDoubleByte = sm::testing::DoubleByteCodePage;
 
 // Shift-JIS characters: full-width "a" (lead 0x82, trail 0x81) and one whose trail byte is 0x5C,
 // the backslash byte.

@@ -1,6 +1,8 @@
 // Paths: the validity check, component arithmetic, the length limit and file comparison.
 #include <gtest/gtest.h>
 
+#include "DoubleByteCodePage.h"
+
 #include <chrono>
 #include <filesystem>
 #include <fstream>
@@ -25,15 +27,7 @@ TEException CatchTE(Body body) {
     return {};
 }
 
-class PathDoubleByte : public ::testing::Test {
-protected:
-    void SetUp() override {
-        previous = GetMultiByteCodePage();
-        ASSERT_TRUE(SetMultiByteCodePage(932));
-    }
-    void TearDown() override { SetMultiByteCodePage(previous); }
-    int previous = 0;
-};
+using PathDoubleByte = sm::testing::DoubleByteCodePage;
 
 // Shift-JIS characters whose trail bytes are the backslash (0x5C) and the bar (0x7C).
 const std::string backslashTrail = "\x95\x5C";

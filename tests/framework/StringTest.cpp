@@ -1,6 +1,8 @@
 // String family: storage kinds, copy-on-write sharing, character positions and message arguments.
 #include <gtest/gtest.h>
 
+#include "DoubleByteCodePage.h"
+
 #include <string>
 
 #include "framework/CodePage.h"
@@ -10,16 +12,7 @@
 using namespace sm;
 
 namespace {
-// Runs a test body under a double-byte code page and restores the previous one afterwards.
-class DoubleByteCodePage : public ::testing::Test {
-protected:
-    void SetUp() override {
-        previous = GetMultiByteCodePage();
-        ASSERT_TRUE(SetMultiByteCodePage(932));
-    }
-    void TearDown() override { SetMultiByteCodePage(previous); }
-    int previous = 0;
-};
+using sm::testing::DoubleByteCodePage;
 
 // Shift-JIS "a" in full width: lead 0x82, trail 0x81.
 const std::string wideA = "\x82\x81";

@@ -2,6 +2,8 @@
 // how the external-process prefixes are recognised, removed and added.
 #include <gtest/gtest.h>
 
+#include "DoubleByteCodePage.h"
+
 #include <string>
 
 #include "framework/CodePage.h"
@@ -22,15 +24,7 @@ Separator SeparatorOf(const std::string& text) {
     return found;
 }
 
-class DoubleByteCodePage : public ::testing::Test {
-protected:
-    void SetUp() override {
-        previous = GetMultiByteCodePage();
-        ASSERT_TRUE(SetMultiByteCodePage(932));
-    }
-    void TearDown() override { SetMultiByteCodePage(previous); }
-    int previous = 0;
-};
+using sm::testing::DoubleByteCodePage;
 
 // Shift-JIS characters: a full-width letter, and one whose trail byte is a backslash (0x5C).
 const std::string wideA = "\x82\x81";
