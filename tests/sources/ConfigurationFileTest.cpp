@@ -108,7 +108,7 @@ TEST_F(ConfigurationFile, RegenerationWritesOneSectionPerDetectedDriver) {
     std::int32_t before = CurrentGeneration();
     ::DeleteFileA(file.c_str());
     Copy(SCAN_STANDARD, platform + "\\abc.dll");
-    Copy(SCAN_IVISPECIFIC, platform + "\\ivi.dll");
+    Copy(SCAN_IVIDRIVER, platform + "\\ivi.dll");
     Copy(SCAN_OTHERCASE, platform + "\\odd.dll");
     Copy(SCAN_RESETOTHERCASE, platform + "\\rst.dll");
     WriteBytes(platform + "\\junk.dll", "not an image");
