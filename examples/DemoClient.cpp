@@ -8,6 +8,7 @@
 #include <mutex>
 #include <string>
 #include <thread>
+#include <vector>
 
 #include "com/ComPtr.h"
 #include "com/Interfaces.h"
@@ -194,6 +195,60 @@ void ShowLockHandOff(IInstrSessionMgr* manager) {
     PrintLockState("[main]  ", holderSession.Get());
 }
 
+std::vector<std::string> Strings(SAFEARRAY* array) {
+    std::vector<std::string> strings;
+    LONG upper = -1;
+    ::SafeArrayGetUBound(array, 1, &upper);
+    for (LONG index = 0; index <= upper; ++index) {
+        UniqueBstr element;
+        ::SafeArrayGetElement(array, &index, element.Put());
+        strings.push_back(Narrow(element.Get()));
+    }
+    return strings;
+}
+
+// What the host's instrument dialogs ask: which names can be opened, which categories exist, which
+// sessions are alive. The names come from the simulated configuration file that demo.sh set up.
+void ShowListings(IInstrSessionMgr* manager) {
+    Print("\n== Listings ==\n");
+    auto any = Wide(L""), noFilter = Wide(L"");
+    UniqueSafeArray names;
+    auto flags = static_cast<GetNamesOptions>(ReturnLogicalNames | ReturnVirtualInstruments | IncludeCategoryPrefix);
+    Check(manager->GetNames(any.Get(), flags, noFilter.Get(), names.Put()), "GetNames");
+    Print("GetNames(\"\", logical names and virtual instruments, with category prefix):\n");
+    for (const auto& name : Strings(names.Get())) Print("   %s\n", name.c_str());
+
+    UniqueSafeArray categories;
+    Check(manager->GetCategories(any.Get(), categories.Put()), "GetCategories");
+    Print("GetCategories(\"\"):");
+    for (const auto& category : Strings(categories.Get())) Print(" %s", category.c_str());
+    Print("\n");
+
+    // A logical name of the configuration file opens its virtual instrument's session.
+    ComPtr<IInstrSession> dmm;
+    auto logicalName = Wide(L"DMM1");
+    Check(manager->GetInstrSession(logicalName.Get(), VARIANT_FALSE, dmm.Put()), "GetInstrSession(DMM1)");
+    UniqueBstr category;
+    Check(dmm->get_Category(category.Put()), "get_Category");
+    Print("GetInstrSession(\"DMM1\") gives a session of category %s\n", Narrow(category.Get()).c_str());
+
+    UniqueSafeArray sessions;
+    Check(manager->GetSessions(any.Get(), sessions.Put()), "GetSessions");
+    LONG upper = -1;
+    ::SafeArrayGetUBound(sessions.Get(), 1, &upper);
+    Print("GetSessions(\"\"): %ld live sessions:", upper + 1);
+    for (LONG index = 0; index <= upper; ++index) {
+        ComPtr<IDispatch> element;
+        ::SafeArrayGetElement(sessions.Get(), &index, element.PutVoid());
+        ComPtr<IInstrSession> session = element.As<IInstrSession>();
+        UniqueBstr name, sessionCategory;
+        session->get_Name(name.Put());
+        session->get_Category(sessionCategory.Put());
+        Print(" %s::%s", Narrow(sessionCategory.Get()).c_str(), Narrow(name.Get()).c_str());
+    }
+    Print("\n");
+}
+
 void ShowManagerState(IInstrSessionMgr* manager) {
     Print("\n== Manager state ==\n");
     UniqueBstr state;
@@ -209,6 +264,7 @@ int main() {
         auto manager = CreateManager();
         auto bench = ShowSharedSession(manager.Get());
         ShowLockHandOff(manager.Get());
+        ShowListings(manager.Get());
         ShowManagerState(manager.Get());
         Print("\nDemoClient finished\n");
         return 0;

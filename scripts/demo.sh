@@ -10,7 +10,7 @@ source "$root/scripts/lib.sh"
 sm_install_packages
 sm_configure_windows
 echo "== building SessionMgr.dll and DemoClient.exe in $SM_WINDOWS_BUILD =="
-cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
+cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient scan_standard >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
   { cat "$SM_WINDOWS_BUILD/demo-build.log"; exit 1; }
 
 sm_start_wine
@@ -28,6 +28,23 @@ if ! timeout 60 wine regsvr32 /s "$dll" >"$out/regsvr32.txt" 2>&1; then
   cat "$out/regsvr32.txt"
   exit 1
 fi
+
+# A simulated instrument setup: a VXIplug&play directory with one driver image and a configuration
+# file that names a virtual instrument and two logical names.
+setup="$out/instruments"
+mkdir -p "$setup/Win64"
+cp "$SM_WINDOWS_BUILD/sim/vxipnp/scan_standard.dll" "$setup/Win64/abc_64.dll"
+timeout 60 wine winepath -w "$setup" >"$out/instruments.winpath" 2>/dev/null || true
+setup_windows="$(tr -d '\r\n' <"$out/instruments.winpath")"
+module_path="$setup_windows\\Win64\\abc_64.dll"
+# Quoted values of the file use backslash escapes: every backslash of the path is written twice.
+printf '%s\n' \
+  '[VXIPNP Logical Names]' 'DMM1 = "VPPVInstr->BenchDMM"' '' \
+  '[VISA Logical Names]' 'Serial1 = "ASRL1::INSTR"' '' \
+  '[VPPVInstr->BenchDMM]' "ModulePath = \"${module_path//\\/\\\\}\"" 'Prefix = "abc"' \
+  'Resource = "GPIB0::14::INSTR"' 'IDQuery = True' 'Reset = True' >"$setup/Win64/QVSessionMgr.ini"
+# Through the environment rather than the registry, so the prefix the tests share stays untouched.
+export VXIPNPPATH="$setup_windows"
 
 status=0
 
