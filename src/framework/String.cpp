@@ -257,7 +257,7 @@ void DynamicString::MakeWritable(std::size_t neededBytes) {
     if (buffer->ReferenceCount() != 1 || buffer == CopyOnWriteMemory::GlobalEmpty()) {
         std::size_t size = Size();
         CopyOnWriteMemory* own = CopyOnWriteMemory::Create(std::max(neededBytes, size + 1));
-        std::memcpy(own->data(), buffer->data(), size + 1);
+        std::memcpy(own->Bytes(), buffer->Bytes(), size + 1);
         buffer->Release();
         buffer = own;
     } else {
@@ -272,7 +272,7 @@ void DynamicString::Splice(std::size_t byteOffset, std::size_t removeBytes, std:
     std::size_t newSize = size - removeBytes + insert.size();
     if (newSize == 0 && size == 0) return;
     MakeWritable(newSize + 1);
-    char* data = buffer->data();
+    char* data = buffer->Bytes();
     std::memmove(data + byteOffset + insert.size(), data + byteOffset + removeBytes, size - byteOffset - removeBytes + 1);
     if (!insert.empty()) std::memcpy(data + byteOffset, insert.data(), insert.size());
     ForgetSize();
@@ -280,7 +280,7 @@ void DynamicString::Splice(std::size_t byteOffset, std::size_t removeBytes, std:
 
 char* DynamicString::WritableData() {
     MakeWritable(Size() + 1);
-    return buffer->data();
+    return buffer->Bytes();
 }
 
 std::size_t DynamicString::Reserve(std::size_t byteCount) {

@@ -89,8 +89,8 @@ public:
     static CopyOnWriteMemory* GlobalEmpty();
     static CopyOnWriteMemory* Create(std::size_t capacity);
 
-    char* data() { return bytes; }
-    std::size_t capacity() const { return capacityBytes; }
+    char* Bytes() { return bytes; }
+    std::size_t Capacity() const { return capacityBytes; }
     std::uint32_t ReferenceCount() const { return references.load(); }
     void AddReference() { references.fetch_add(1); }
     void Release();
@@ -120,13 +120,13 @@ public:
 
     using String::Assign;
     String& Assign(const String& text) override;
-    std::size_t GetCapacity() const override { return buffer->capacity() ? buffer->capacity() - 1 : 0; }
+    std::size_t GetCapacity() const override { return buffer->Capacity() ? buffer->Capacity() - 1 : 0; }
     std::size_t Reserve(std::size_t byteCount) override;
     // Exposed so tests and callers can see whether two strings share storage.
     const CopyOnWriteMemory* SharedBuffer() const { return buffer; }
 
 protected:
-    const char* Data() const override { return buffer->data(); }
+    const char* Data() const override { return buffer->Bytes(); }
     void Splice(std::size_t byteOffset, std::size_t removeBytes, std::string_view insert) override;
     char* WritableData() override;
 

@@ -105,9 +105,6 @@ private:
     std::mutex releaseMutex;
     std::condition_variable released;
     std::uint64_t releaseCount = 0;
-
-    template <class Session>
-    friend class InstrSession;
 };
 
 }  // namespace sm
