@@ -23,6 +23,8 @@
 #include <vector>
 
 #include "SessionMgr.h"
+#include "com/ComPtr.h"
+#include "com/UniqueHandles.h"
 
 #ifndef SESSIONMGR_TLB_PATH
 #error "SESSIONMGR_TLB_PATH must name the compiled SessionMgr.tlb"
@@ -34,66 +36,18 @@ namespace {
 // Owning wrappers for the handles these tests touch.
 
 template <class T>
-class ComRef {
-public:
-    ComRef() = default;
-    ComRef(const ComRef&) = delete;
-    ComRef& operator=(const ComRef&) = delete;
-    ComRef(ComRef&& other) noexcept : ptr_(std::exchange(other.ptr_, nullptr)) {}
-    ComRef& operator=(ComRef&& other) noexcept
-    {
-        if (this != &other) {
-            reset();
-            ptr_ = std::exchange(other.ptr_, nullptr);
-        }
-        return *this;
-    }
-    ~ComRef() { reset(); }
+using ComRef = sm::ComPtr<T>;
 
-    void reset()
-    {
-        if (ptr_ != nullptr) {
-            std::exchange(ptr_, nullptr)->Release();
-        }
-    }
-    T** put()
-    {
-        reset();
-        return &ptr_;
-    }
-    T* get() const { return ptr_; }
-    T* operator->() const { return ptr_; }
-    explicit operator bool() const { return ptr_ != nullptr; }
+using Bstr = sm::UniqueBstr;
 
-private:
-    T* ptr_ = nullptr;
-};
-
-class Bstr {
-public:
-    Bstr() = default;
-    Bstr(const Bstr&) = delete;
-    Bstr& operator=(const Bstr&) = delete;
-    ~Bstr() { SysFreeString(value_); }
-
-    BSTR* put()
-    {
-        SysFreeString(value_);
-        value_ = nullptr;
-        return &value_;
+// A null BSTR (no text at all) is distinct from an empty one in a type library.
+std::optional<std::wstring> TextOf(const Bstr& value)
+{
+    if (value.Get() == nullptr) {
+        return std::nullopt;
     }
-    // A null BSTR (no text at all) is distinct from an empty one in a type library.
-    std::optional<std::wstring> text() const
-    {
-        if (value_ == nullptr) {
-            return std::nullopt;
-        }
-        return std::wstring(value_, SysStringLen(value_));
-    }
-
-private:
-    BSTR value_ = nullptr;
-};
+    return std::wstring(value.Get(), SysStringLen(value.Get()));
+}
 
 // ITypeInfo::GetNames fills a caller-provided array of BSTRs.
 template <size_t Capacity>
@@ -206,19 +160,19 @@ std::wstring tlbPath()
 std::optional<std::wstring> typeName(ITypeInfo* info)
 {
     Bstr name;
-    if (FAILED(info->GetDocumentation(MEMBERID_NIL, name.put(), nullptr, nullptr, nullptr))) {
+    if (FAILED(info->GetDocumentation(MEMBERID_NIL, name.Put(), nullptr, nullptr, nullptr))) {
         return std::nullopt;
     }
-    return name.text();
+    return TextOf(name);
 }
 
 std::optional<std::wstring> typeHelp(ITypeInfo* info)
 {
     Bstr help;
-    if (FAILED(info->GetDocumentation(MEMBERID_NIL, nullptr, help.put(), nullptr, nullptr))) {
+    if (FAILED(info->GetDocumentation(MEMBERID_NIL, nullptr, help.Put(), nullptr, nullptr))) {
         return std::nullopt;
     }
-    return help.text();
+    return TextOf(help);
 }
 
 // Renders a parameter or return type in the notation of the interface definition, so that the
@@ -234,10 +188,10 @@ std::wstring typeText(ITypeInfo* context, const TYPEDESC& type)
         return L"SAFEARRAY(" + typeText(context, *type.lptdesc) + L")";
     case VT_USERDEFINED: {
         ComRef<ITypeInfo> referenced;
-        if (FAILED(context->GetRefTypeInfo(type.hreftype, referenced.put()))) {
+        if (FAILED(context->GetRefTypeInfo(type.hreftype, referenced.Put()))) {
             return L"<unresolved reference>";
         }
-        return typeName(referenced.get()).value_or(L"<unnamed>");
+        return typeName(referenced.Get()).value_or(L"<unnamed>");
     }
     case VT_BSTR: return L"BSTR";
     case VT_BOOL: return L"VARIANT_BOOL";
@@ -258,7 +212,7 @@ class TypeLibraryFixture : public testing::Test {
 protected:
     void SetUp() override
     {
-        const HRESULT hr = LoadTypeLibEx(tlbPath().c_str(), REGKIND_NONE, lib_.put());
+        const HRESULT hr = LoadTypeLibEx(tlbPath().c_str(), REGKIND_NONE, lib_.Put());
         ASSERT_EQ(hresultText(hr), hresultText(S_OK)) << "LoadTypeLibEx(" << SESSIONMGR_TLB_PATH << ")";
     }
 
@@ -268,7 +222,7 @@ protected:
         GUID guid{};
         ComRef<ITypeInfo> info;
         if (SUCCEEDED(IIDFromString(guidString, &guid))) {
-            lib_->GetTypeInfoOfGuid(guid, info.put());
+            lib_->GetTypeInfoOfGuid(guid, info.Put());
         }
         return info;
     }
@@ -279,7 +233,7 @@ protected:
         ComRef<ITypeInfo> view;
         HREFTYPE ref = 0;
         if (SUCCEEDED(dispatchView->GetRefTypeOfImplType(static_cast<UINT>(-1), &ref))) {
-            dispatchView->GetRefTypeInfo(ref, view.put());
+            dispatchView->GetRefTypeInfo(ref, view.Put());
         }
         return view;
     }
@@ -293,7 +247,7 @@ protected:
 TEST_F(TypeLibraryFixture, LibraryCarriesItsNameLibidVersionAndLocale)
 {
     LibAttr attr;
-    ASSERT_EQ(hresultText(lib_->GetLibAttr(attr.put(lib_.get()))), hresultText(S_OK));
+    ASSERT_EQ(hresultText(lib_->GetLibAttr(attr.put(lib_.Get()))), hresultText(S_OK));
     EXPECT_EQ(guidText(attr->guid), L"{5C2F91A0-3E44-4B7D-9A15-2D6E8B0C47F1}");
     EXPECT_EQ(attr->wMajorVerNum, 1);
     EXPECT_EQ(attr->wMinorVerNum, 0);
@@ -307,11 +261,11 @@ TEST_F(TypeLibraryFixture, LibraryCarriesItsHelpStringAndHelpFile)
     Bstr help;
     Bstr helpFile;
     DWORD helpContext = 0xFFFFFFFF;
-    ASSERT_EQ(hresultText(lib_->GetDocumentation(-1, name.put(), help.put(), &helpContext, helpFile.put())),
+    ASSERT_EQ(hresultText(lib_->GetDocumentation(-1, name.Put(), help.Put(), &helpContext, helpFile.Put())),
               hresultText(S_OK));
-    EXPECT_EQ(name.text(), L"SM");
-    EXPECT_EQ(help.text(), L"QV Session Manager");
-    EXPECT_EQ(helpFile.text(), L"SMgrRef.chm");
+    EXPECT_EQ(TextOf(name), L"SM");
+    EXPECT_EQ(TextOf(help), L"QV Session Manager");
+    EXPECT_EQ(TextOf(helpFile), L"SMgrRef.chm");
     EXPECT_EQ(helpContext, 0u);
 }
 
@@ -323,14 +277,14 @@ TEST_F(TypeLibraryFixture, IDispatchIsTakenFromTheImportedStandardOleLibrary)
     HREFTYPE baseRef = 0;
     ASSERT_EQ(hresultText(session->GetRefTypeOfImplType(0, &baseRef)), hresultText(S_OK));
     ComRef<ITypeInfo> base;
-    ASSERT_EQ(hresultText(session->GetRefTypeInfo(baseRef, base.put())), hresultText(S_OK));
-    EXPECT_EQ(typeName(base.get()), L"IDispatch");
+    ASSERT_EQ(hresultText(session->GetRefTypeInfo(baseRef, base.Put())), hresultText(S_OK));
+    EXPECT_EQ(typeName(base.Get()), L"IDispatch");
 
     ComRef<ITypeLib> container;
     UINT index = 0;
-    ASSERT_EQ(hresultText(base->GetContainingTypeLib(container.put(), &index)), hresultText(S_OK));
+    ASSERT_EQ(hresultText(base->GetContainingTypeLib(container.Put(), &index)), hresultText(S_OK));
     LibAttr attr;
-    ASSERT_EQ(hresultText(container->GetLibAttr(attr.put(container.get()))), hresultText(S_OK));
+    ASSERT_EQ(hresultText(container->GetLibAttr(attr.put(container.Get()))), hresultText(S_OK));
     EXPECT_EQ(guidText(attr->guid), L"{00020430-0000-0000-C000-000000000046}");
 }
 
@@ -349,10 +303,10 @@ TEST_F(TypeLibraryFixture, LibraryHoldsExactlyTheContractTypes)
     std::vector<std::pair<std::wstring, int>> actual;
     for (UINT i = 0; i < lib_->GetTypeInfoCount(); ++i) {
         ComRef<ITypeInfo> info;
-        ASSERT_EQ(hresultText(lib_->GetTypeInfo(i, info.put())), hresultText(S_OK));
+        ASSERT_EQ(hresultText(lib_->GetTypeInfo(i, info.Put())), hresultText(S_OK));
         TypeAttr attr;
-        ASSERT_EQ(hresultText(info->GetTypeAttr(attr.put(info.get()))), hresultText(S_OK));
-        actual.emplace_back(typeName(info.get()).value_or(L"<unnamed>"), attr->typekind);
+        ASSERT_EQ(hresultText(info->GetTypeAttr(attr.put(info.Get()))), hresultText(S_OK));
+        actual.emplace_back(typeName(info.Get()).value_or(L"<unnamed>"), attr->typekind);
     }
     std::sort(expected.begin(), expected.end());
     std::sort(actual.begin(), actual.end());
@@ -436,7 +390,7 @@ ComRef<ITypeInfo> findType(ITypeLib* lib, const wchar_t* name)
     }
     ComRef<ITypeInfo> owned[4];
     for (USHORT i = 0; i < count; ++i) {
-        *owned[i].put() = found[i];
+        *owned[i].Put() = found[i];
     }
     for (USHORT i = 0; i < count; ++i) {
         if (ids[i] == MEMBERID_NIL) {  // the type itself, not a member that shares its name
@@ -461,10 +415,10 @@ class EnumTypeTest : public TypeLibraryFixture, public testing::WithParamInterfa
 TEST_P(EnumTypeTest, IsAnEnumerationWithExactlyTheListedMembers)
 {
     const EnumContract& contract = *GetParam();
-    ComRef<ITypeInfo> info = findType(lib_.get(), contract.name);
+    ComRef<ITypeInfo> info = findType(lib_.Get(), contract.name);
     ASSERT_TRUE(info) << "no type named " << testing::PrintToString(std::wstring(contract.name));
     TypeAttr attr;
-    ASSERT_EQ(hresultText(info->GetTypeAttr(attr.put(info.get()))), hresultText(S_OK));
+    ASSERT_EQ(hresultText(info->GetTypeAttr(attr.put(info.Get()))), hresultText(S_OK));
     EXPECT_EQ(attr->typekind, TKIND_ENUM);
     EXPECT_EQ(attr->cVars, contract.values.size());
     EXPECT_EQ(attr->cFuncs, 0);
@@ -483,16 +437,16 @@ TEST_P(EnumValueTest, HasItsNameAndValueAtItsPosition)
     const EnumContract& contract = *GetParam().owner;
     const size_t index = GetParam().index;
     const EnumValue& expected = contract.values[index];
-    ComRef<ITypeInfo> info = findType(lib_.get(), contract.name);
+    ComRef<ITypeInfo> info = findType(lib_.Get(), contract.name);
     ASSERT_TRUE(info);
 
     VarDesc var;
-    ASSERT_EQ(hresultText(info->GetVarDesc(static_cast<UINT>(index), var.put(info.get()))),
+    ASSERT_EQ(hresultText(info->GetVarDesc(static_cast<UINT>(index), var.put(info.Get()))),
               hresultText(S_OK));
     Bstr name;
-    ASSERT_EQ(hresultText(info->GetDocumentation(var->memid, name.put(), nullptr, nullptr, nullptr)),
+    ASSERT_EQ(hresultText(info->GetDocumentation(var->memid, name.Put(), nullptr, nullptr, nullptr)),
               hresultText(S_OK));
-    EXPECT_EQ(name.text(), expected.name);
+    EXPECT_EQ(TextOf(name), expected.name);
     EXPECT_EQ(var->varkind, VAR_CONST);
     ASSERT_NE(var->lpvarValue, nullptr);
     EXPECT_EQ(V_VT(var->lpvarValue), VT_I4);
@@ -774,11 +728,11 @@ TEST_P(InterfaceTest, DispatchViewIsDualWithItsNameAndHelpString)
     ComRef<ITypeInfo> info = infoOf(contract.iid);
     ASSERT_TRUE(info) << "no type with IID " << testing::PrintToString(std::wstring(contract.iid));
     TypeAttr attr;
-    ASSERT_EQ(hresultText(info->GetTypeAttr(attr.put(info.get()))), hresultText(S_OK));
+    ASSERT_EQ(hresultText(info->GetTypeAttr(attr.put(info.Get()))), hresultText(S_OK));
     EXPECT_EQ(attr->typekind, TKIND_DISPATCH);
     EXPECT_EQ(attr->wTypeFlags, TYPEFLAG_FDUAL | TYPEFLAG_FDISPATCHABLE);
-    EXPECT_EQ(typeName(info.get()), contract.name);
-    EXPECT_EQ(typeHelp(info.get()), contract.help);
+    EXPECT_EQ(typeName(info.Get()), contract.name);
+    EXPECT_EQ(typeHelp(info.Get()), contract.help);
     // Late-bound clients see the IUnknown/IDispatch slots followed by every member.
     EXPECT_EQ(attr->cFuncs, DispatchSlots + contract.members.size());
 }
@@ -788,15 +742,15 @@ TEST_P(InterfaceTest, VtableViewIsOleAutomationDerivedFromIDispatch)
     const InterfaceContract& contract = *GetParam();
     ComRef<ITypeInfo> info = infoOf(contract.iid);
     ASSERT_TRUE(info);
-    ComRef<ITypeInfo> vtable = vtableViewOf(info.get());
+    ComRef<ITypeInfo> vtable = vtableViewOf(info.Get());
     ASSERT_TRUE(vtable) << "dual interface without a vtable view";
     TypeAttr attr;
-    ASSERT_EQ(hresultText(vtable->GetTypeAttr(attr.put(vtable.get()))), hresultText(S_OK));
+    ASSERT_EQ(hresultText(vtable->GetTypeAttr(attr.put(vtable.Get()))), hresultText(S_OK));
     EXPECT_EQ(attr->typekind, TKIND_INTERFACE);
     EXPECT_EQ(attr->wTypeFlags, TYPEFLAG_FDUAL | TYPEFLAG_FDISPATCHABLE | TYPEFLAG_FOLEAUTOMATION);
     EXPECT_EQ(guidText(attr->guid), contract.iid);
-    EXPECT_EQ(typeName(vtable.get()), contract.name);
-    EXPECT_EQ(typeHelp(vtable.get()), contract.help);
+    EXPECT_EQ(typeName(vtable.Get()), contract.name);
+    EXPECT_EQ(typeHelp(vtable.Get()), contract.help);
     EXPECT_EQ(attr->cFuncs, contract.members.size());
     EXPECT_EQ(attr->cbSizeVft, (DispatchSlots + contract.members.size()) * sizeof(void*));
     ASSERT_EQ(attr->cImplTypes, 1);
@@ -804,8 +758,8 @@ TEST_P(InterfaceTest, VtableViewIsOleAutomationDerivedFromIDispatch)
     HREFTYPE baseRef = 0;
     ASSERT_EQ(hresultText(vtable->GetRefTypeOfImplType(0, &baseRef)), hresultText(S_OK));
     ComRef<ITypeInfo> base;
-    ASSERT_EQ(hresultText(vtable->GetRefTypeInfo(baseRef, base.put())), hresultText(S_OK));
-    EXPECT_EQ(typeName(base.get()), L"IDispatch");
+    ASSERT_EQ(hresultText(vtable->GetRefTypeInfo(baseRef, base.Put())), hresultText(S_OK));
+    EXPECT_EQ(typeName(base.Get()), L"IDispatch");
 }
 
 INSTANTIATE_TEST_SUITE_P(Interfaces, InterfaceTest,
@@ -826,7 +780,7 @@ protected:
         }
         dispatch_ = infoOf(GetParam().owner->iid);
         ASSERT_TRUE(dispatch_);
-        vtable_ = vtableViewOf(dispatch_.get());
+        vtable_ = vtableViewOf(dispatch_.Get());
         ASSERT_TRUE(vtable_);
     }
 
@@ -839,7 +793,7 @@ TEST_P(MemberTest, OccupiesItsVtableSlotWithItsDispidAndInvokeKind)
     const MemberRow& row = GetParam();
     const Member& expected = row.member();
     FuncDesc func;
-    ASSERT_EQ(hresultText(vtable_->GetFuncDesc(static_cast<UINT>(row.index), func.put(vtable_.get()))),
+    ASSERT_EQ(hresultText(vtable_->GetFuncDesc(static_cast<UINT>(row.index), func.put(vtable_.Get()))),
               hresultText(S_OK));
     EXPECT_EQ(func->oVft, static_cast<SHORT>((DispatchSlots + row.index) * sizeof(void*)));
     EXPECT_EQ(func->memid, expected.dispid);
@@ -847,7 +801,7 @@ TEST_P(MemberTest, OccupiesItsVtableSlotWithItsDispidAndInvokeKind)
     EXPECT_EQ(func->funckind, FUNC_PUREVIRTUAL);
     EXPECT_EQ(func->callconv, CC_STDCALL);
     EXPECT_EQ(func->wFuncFlags, expected.flags);
-    EXPECT_EQ(typeText(vtable_.get(), func->elemdescFunc.tdesc), L"HRESULT");
+    EXPECT_EQ(typeText(vtable_.Get(), func->elemdescFunc.tdesc), L"HRESULT");
 }
 
 TEST_P(MemberTest, DeclaresItsParametersWithTypesDirectionsAndDefaults)
@@ -855,14 +809,14 @@ TEST_P(MemberTest, DeclaresItsParametersWithTypesDirectionsAndDefaults)
     const MemberRow& row = GetParam();
     const Member& expected = row.member();
     FuncDesc func;
-    ASSERT_EQ(hresultText(vtable_->GetFuncDesc(static_cast<UINT>(row.index), func.put(vtable_.get()))),
+    ASSERT_EQ(hresultText(vtable_->GetFuncDesc(static_cast<UINT>(row.index), func.put(vtable_.Get()))),
               hresultText(S_OK));
     ASSERT_EQ(func->cParams, static_cast<SHORT>(expected.params.size()));
     for (size_t i = 0; i < expected.params.size(); ++i) {
         SCOPED_TRACE("parameter " + std::to_string(i));
         const Param& p = expected.params[i];
         const ELEMDESC& actual = func->lprgelemdescParam[i];
-        EXPECT_EQ(typeText(vtable_.get(), actual.tdesc), p.type);
+        EXPECT_EQ(typeText(vtable_.Get(), actual.tdesc), p.type);
         EXPECT_EQ(actual.paramdesc.wParamFlags, p.flags);
         if (p.defaultText != nullptr) {
             ASSERT_NE(actual.paramdesc.pparamdescex, nullptr);
@@ -904,12 +858,12 @@ TEST_P(MemberTest, CarriesItsHelpString)
 {
     const Member& expected = GetParam().member();
     Bstr help;
-    ASSERT_EQ(hresultText(vtable_->GetDocumentation(expected.dispid, nullptr, help.put(), nullptr, nullptr)),
+    ASSERT_EQ(hresultText(vtable_->GetDocumentation(expected.dispid, nullptr, help.Put(), nullptr, nullptr)),
               hresultText(S_OK));
     if (expected.help == nullptr) {
-        EXPECT_EQ(help.text(), std::nullopt);
+        EXPECT_EQ(TextOf(help), std::nullopt);
     } else {
-        EXPECT_EQ(help.text(), expected.help);
+        EXPECT_EQ(TextOf(help), expected.help);
     }
 }
 
@@ -921,7 +875,7 @@ TEST_P(MemberTest, AppearsInTheDispatchViewWithItsRetvalAsResult)
     const Member& expected = row.member();
     FuncDesc func;
     ASSERT_EQ(hresultText(dispatch_->GetFuncDesc(static_cast<UINT>(DispatchSlots + row.index),
-                                                 func.put(dispatch_.get()))),
+                                                 func.put(dispatch_.Get()))),
               hresultText(S_OK));
     EXPECT_EQ(func->memid, expected.dispid);
     EXPECT_EQ(func->invkind, invokeKind(expected.kind));
@@ -934,7 +888,7 @@ TEST_P(MemberTest, AppearsInTheDispatchViewWithItsRetvalAsResult)
         result = retval->type;
         result.pop_back();  // the result is what the retval pointer points to
     }
-    EXPECT_EQ(typeText(dispatch_.get(), func->elemdescFunc.tdesc), result);
+    EXPECT_EQ(typeText(dispatch_.Get(), func->elemdescFunc.tdesc), result);
     EXPECT_EQ(func->cParams, static_cast<SHORT>(expected.params.size() - (retval != nullptr ? 1 : 0)));
 }
 
@@ -984,10 +938,10 @@ TEST_P(FreeDispidTest, IsNotAssignedToAnyMember)
 {
     ComRef<ITypeInfo> info = infoOf(GetParam().iid);
     ASSERT_TRUE(info);
-    ComRef<ITypeInfo> vtable = vtableViewOf(info.get());
+    ComRef<ITypeInfo> vtable = vtableViewOf(info.Get());
     ASSERT_TRUE(vtable);
     ComRef<ITypeInfo2> info2;
-    ASSERT_EQ(hresultText(vtable->QueryInterface(__uuidof(ITypeInfo2), reinterpret_cast<void**>(info2.put()))),
+    ASSERT_EQ(hresultText(vtable->QueryInterface(__uuidof(ITypeInfo2), reinterpret_cast<void**>(info2.Put()))),
               hresultText(S_OK));
     UINT found = 12345;
     ASSERT_EQ(hresultText(info2->GetFuncIndexOfMemId(GetParam().neighbour, INVOKE_FUNC, &found)),
@@ -1049,10 +1003,10 @@ TEST_P(CoclassTest, HasItsClsidNameHelpAndCreatability)
     ComRef<ITypeInfo> info = infoOf(contract.clsid);
     ASSERT_TRUE(info) << "no type with CLSID " << testing::PrintToString(std::wstring(contract.clsid));
     TypeAttr attr;
-    ASSERT_EQ(hresultText(info->GetTypeAttr(attr.put(info.get()))), hresultText(S_OK));
+    ASSERT_EQ(hresultText(info->GetTypeAttr(attr.put(info.Get()))), hresultText(S_OK));
     EXPECT_EQ(attr->typekind, TKIND_COCLASS);
-    EXPECT_EQ(typeName(info.get()), contract.name);
-    EXPECT_EQ(typeHelp(info.get()), contract.help);
+    EXPECT_EQ(typeName(info.Get()), contract.name);
+    EXPECT_EQ(typeHelp(info.Get()), contract.help);
     // Only the manager may be created by clients; the rest come from the manager or a session.
     EXPECT_EQ(attr->wTypeFlags, contract.creatable ? TYPEFLAG_FCANCREATE : 0);
 }
@@ -1063,7 +1017,7 @@ TEST_P(CoclassTest, ImplementsOnlyItsDefaultInterface)
     ComRef<ITypeInfo> info = infoOf(contract.clsid);
     ASSERT_TRUE(info);
     TypeAttr attr;
-    ASSERT_EQ(hresultText(info->GetTypeAttr(attr.put(info.get()))), hresultText(S_OK));
+    ASSERT_EQ(hresultText(info->GetTypeAttr(attr.put(info.Get()))), hresultText(S_OK));
     ASSERT_EQ(attr->cImplTypes, 1);
     INT flags = -1;
     ASSERT_EQ(hresultText(info->GetImplTypeFlags(0, &flags)), hresultText(S_OK));
@@ -1071,8 +1025,8 @@ TEST_P(CoclassTest, ImplementsOnlyItsDefaultInterface)
     HREFTYPE ref = 0;
     ASSERT_EQ(hresultText(info->GetRefTypeOfImplType(0, &ref)), hresultText(S_OK));
     ComRef<ITypeInfo> implemented;
-    ASSERT_EQ(hresultText(info->GetRefTypeInfo(ref, implemented.put())), hresultText(S_OK));
-    EXPECT_EQ(typeName(implemented.get()), contract.defaultInterface);
+    ASSERT_EQ(hresultText(info->GetRefTypeInfo(ref, implemented.Put())), hresultText(S_OK));
+    EXPECT_EQ(typeName(implemented.Get()), contract.defaultInterface);
 }
 
 INSTANTIATE_TEST_SUITE_P(Classes, CoclassTest, testing::ValuesIn(coclassTable()),
