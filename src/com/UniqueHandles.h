@@ -72,6 +72,18 @@ private:
     VARIANT value;
 };
 
+// EXCEPINFO that frees the strings IDispatch::Invoke filled in.
+struct UniqueExcepInfo : EXCEPINFO {
+    UniqueExcepInfo() : EXCEPINFO{} {}
+    UniqueExcepInfo(const UniqueExcepInfo&) = delete;
+    UniqueExcepInfo& operator=(const UniqueExcepInfo&) = delete;
+    ~UniqueExcepInfo() {
+        ::SysFreeString(bstrSource);
+        ::SysFreeString(bstrDescription);
+        ::SysFreeString(bstrHelpFile);
+    }
+};
+
 // Recursive critical section with a scoped guard.
 class CriticalSection {
 public:

@@ -103,7 +103,7 @@ struct LateResult {
 LateResult Invoke(IDispatch* target, DISPID member, WORD flags, const Arguments& arguments, VARIANT* result) {
     std::vector<VARIANT> reversed = arguments.Reversed();
     DISPPARAMS parameters{reversed.data(), nullptr, static_cast<UINT>(reversed.size()), 0};
-    EXCEPINFO exception{};
+    UniqueExcepInfo exception;
     LateResult outcome;
     outcome.result = target->Invoke(member, IID_NULL, 0, flags, &parameters, result, &exception, nullptr);
     if (outcome.result == DISP_E_EXCEPTION) {
@@ -111,9 +111,6 @@ LateResult Invoke(IDispatch* target, DISPID member, WORD flags, const Arguments&
         outcome.code = static_cast<unsigned long>(exception.scode);
         outcome.description = Text(exception.bstrDescription);
     }
-    ::SysFreeString(exception.bstrSource);
-    ::SysFreeString(exception.bstrDescription);
-    ::SysFreeString(exception.bstrHelpFile);
     return outcome;
 }
 

@@ -39,12 +39,9 @@ HRESULT CallByName(IDispatch* object, const wchar_t* name, std::vector<VARIANT> 
     if (FAILED(found)) return found;
     std::vector<VARIANT> reversed(arguments.rbegin(), arguments.rend());
     DISPPARAMS parameters{reversed.data(), nullptr, static_cast<UINT>(reversed.size()), 0};
-    EXCEPINFO exception{};
+    UniqueExcepInfo exception;
     HRESULT invoked = object->Invoke(member, IID_NULL, LOCALE_USER_DEFAULT, DISPATCH_METHOD, &parameters, result,
                                      &exception, nullptr);
-    ::SysFreeString(exception.bstrSource);
-    ::SysFreeString(exception.bstrDescription);
-    ::SysFreeString(exception.bstrHelpFile);
     return invoked;
 }
 

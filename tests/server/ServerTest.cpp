@@ -144,15 +144,12 @@ TEST(ErrorInfo, ReachesLateBoundClientsThroughExcepInfo) {
     arguments[1].bstrVal = ::SysAllocString(L"Nowhere");
     DISPPARAMS parameters{arguments, nullptr, 2, 0};
     UniqueVariant result;
-    EXCEPINFO exception{};
+    UniqueExcepInfo exception;
     HRESULT invoked = dispatch->Invoke(0x03, IID_NULL, 0, DISPATCH_METHOD, &parameters, result.Get(), &exception, nullptr);
     ::VariantClear(&arguments[1]);
     EXPECT_EQ(invoked, DISP_E_EXCEPTION);
     EXPECT_EQ(static_cast<unsigned long>(exception.scode), 0xFFFFBC68ul);
     EXPECT_EQ(Text(exception.bstrDescription), "'Nowhere' is not a driver session name");
-    ::SysFreeString(exception.bstrDescription);
-    ::SysFreeString(exception.bstrSource);
-    ::SysFreeString(exception.bstrHelpFile);
 }
 
 TEST(ModuleResources, CarryTheModuleNameAndTheTypeLibrary) {
