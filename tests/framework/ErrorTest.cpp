@@ -1,6 +1,8 @@
 // TE codes, default messages, the language table and the raise site's record.
 #include <gtest/gtest.h>
 
+#include "CatchTE.h"
+
 #include <sstream>
 #include <string>
 
@@ -9,17 +11,9 @@
 #include "framework/TEException.h"
 
 using namespace sm;
+using sm::testing::CatchTE;
 
 namespace {
-TEException Catch(void (*raise)()) {
-    try {
-        raise();
-    } catch (const TEException& caught) {
-        return caught;
-    }
-    ADD_FAILURE() << "nothing was raised";
-    return {};
-}
 }  // namespace
 
 TEST(DefaultMessages, ComeFromTheCodesRow) {
@@ -55,7 +49,7 @@ TEST(LanguageTable, MissingKeysGiveTheDefaultOrTheNotFoundText) {
 }
 
 TEST(Raising, FillsTheRecordFromTheSite) {
-    TEException caught = Catch([] { TE_RAISE(TE_OPERATION_TIMED_OUT, "SessionBase::base_LockSession"); });
+    TEException caught = CatchTE([] { TE_RAISE(TE_OPERATION_TIMED_OUT, "SessionBase::base_LockSession"); });
     EXPECT_EQ(caught.GetErrorCode(), -17402);
     EXPECT_STREQ(caught.GetDescription(), "Operation Timed Out.");
     EXPECT_STREQ(caught.GetFunction(), "SessionBase::base_LockSession");
@@ -69,17 +63,17 @@ TEST(Raising, FillsTheRecordFromTheSite) {
 }
 
 TEST(Raising, MessagesAndTheirFallbacks) {
-    EXPECT_STREQ(Catch([] { TE_RAISE(-1, "A::B"); }).GetDescription(), "User-defined error code.");
-    EXPECT_STREQ(Catch([] { TE_RAISE(TE_UNRECOGNIZED_VALUE, "A::B", ""); }).GetDescription(), "Unrecognized value.");
-    EXPECT_STREQ(Catch([] { TE_RAISE(TE_UNRECOGNIZED_VALUE, "A::B", "'X' is bad"); }).GetDescription(), "'X' is bad");
+    EXPECT_STREQ(CatchTE([] { TE_RAISE(-1, "A::B"); }).GetDescription(), "User-defined error code.");
+    EXPECT_STREQ(CatchTE([] { TE_RAISE(TE_UNRECOGNIZED_VALUE, "A::B", ""); }).GetDescription(), "Unrecognized value.");
+    EXPECT_STREQ(CatchTE([] { TE_RAISE(TE_UNRECOGNIZED_VALUE, "A::B", "'X' is bad"); }).GetDescription(), "'X' is bad");
     // A message held in a String is taken as it is, even when empty.
-    EXPECT_STREQ(Catch([] { TE_RAISE(TE_UNRECOGNIZED_VALUE, "A::B", DynamicString()); }).GetDescription(), "");
-    EXPECT_STREQ(Catch([] { TE_RAISE(0, "A::B"); }).GetDescription(), "");
+    EXPECT_STREQ(CatchTE([] { TE_RAISE(TE_UNRECOGNIZED_VALUE, "A::B", DynamicString()); }).GetDescription(), "");
+    EXPECT_STREQ(CatchTE([] { TE_RAISE(0, "A::B"); }).GetDescription(), "");
 }
 
 TEST(Raising, LongNamesAreCutToTheirFields) {
     static const std::string longName(300, 'f');
-    TEException caught = Catch([] { TE_RAISE(TE_PROGRAM_ERROR, longName.c_str()); });
+    TEException caught = CatchTE([] { TE_RAISE(TE_PROGRAM_ERROR, longName.c_str()); });
     EXPECT_EQ(std::string(caught.GetFunction()), std::string(256, 'f'));
     caught.SetApiFunction(std::string(100, 'a').c_str());
     EXPECT_EQ(std::string(caught.GetApiFunction()).size(), 64u);
@@ -90,7 +84,7 @@ TEST(Raising, LongNamesAreCutToTheirFields) {
 }
 
 TEST(Diagnostics, WriteDescriptionLines) {
-    TEException caught = Catch([] {
+    TEException caught = CatchTE([] {
         TE_RAISE(TE_DLL_NOT_LOADABLE, "CVXIPNPInstrSession::Initialize",
                  RaiseDetails{.message = "Could not load.", .apiErrorCode = 126, .apiFunction = "LoadLibraryA",
                               .source = "driver"});
@@ -104,7 +98,7 @@ TEST(Diagnostics, WriteDescriptionLines) {
                            "  " + caught.GetCompileDate() + "\n\nWhere caught:  CVXIPNPInstrSession::Initialize catch\n";
     EXPECT_EQ(text.str(), expected);
 
-    TEException plain = Catch([] { TE_RAISE(TE_PROGRAM_ERROR, "A::B"); });
+    TEException plain = CatchTE([] { TE_RAISE(TE_PROGRAM_ERROR, "A::B"); });
     std::ostringstream short_;
     plain.WriteDescription("here", short_);
     EXPECT_EQ(short_.str().find("API Function"), std::string::npos);
@@ -113,7 +107,7 @@ TEST(Diagnostics, WriteDescriptionLines) {
 
 TEST(Diagnostics, RaiseCanWriteToTheDebugOutputAtOnce) {
     StartDebugOutputCapture();
-    Catch([] { TE_RAISE(TE_PROGRAM_ERROR, "A::B", RaiseDetails{.writeToDebugOutput = true}); });
+    CatchTE([] { TE_RAISE(TE_PROGRAM_ERROR, "A::B", RaiseDetails{.writeToDebugOutput = true}); });
     std::string written = StopDebugOutputCapture();
     EXPECT_NE(written.find("Program Error.\nError Code: -17001\n"), std::string::npos);
     EXPECT_NE(written.find("Where caught:  Debugging When Exception Constructed\n"), std::string::npos);

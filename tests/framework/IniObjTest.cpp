@@ -2,6 +2,7 @@
 // what would not read back), values, files, and write-read round trips over generated documents.
 #include <gtest/gtest.h>
 
+#include "CatchTE.h"
 #include "DoubleByteCodePage.h"
 
 #include <algorithm>
@@ -22,16 +23,7 @@ namespace fs = std::filesystem;
 
 namespace {
 
-template <class Body>
-TEException CatchTE(Body body) {
-    try {
-        body();
-    } catch (const TEException& caught) {
-        return caught;
-    }
-    ADD_FAILURE() << "nothing was raised";
-    return {};
-}
+using sm::testing::CatchTE;
 
 std::vector<std::string> Lines(std::string_view text) {
     TextLineSource source(text);

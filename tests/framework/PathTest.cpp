@@ -1,6 +1,7 @@
 // Paths: the validity check, component arithmetic, the length limit and file comparison.
 #include <gtest/gtest.h>
 
+#include "CatchTE.h"
 #include "DoubleByteCodePage.h"
 
 #include <chrono>
@@ -16,16 +17,7 @@ using namespace sm;
 namespace fs = std::filesystem;
 
 namespace {
-template <class Body>
-TEException CatchTE(Body body) {
-    try {
-        body();
-    } catch (const TEException& caught) {
-        return caught;
-    }
-    ADD_FAILURE() << "nothing was raised";
-    return {};
-}
+using sm::testing::CatchTE;
 
 using PathDoubleByte = sm::testing::DoubleByteCodePage;
 

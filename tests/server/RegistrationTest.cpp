@@ -76,32 +76,24 @@ std::optional<std::string> ReadString(const std::string& path, const char* value
     return std::string(buffer);
 }
 
-std::set<std::string> SubkeyNames(const std::string& path) {
+// Names of a key's subkeys, or of its values (the default value appears as "").
+std::set<std::string> Names(const std::string& path, bool values) {
     std::set<std::string> names;
     UniqueRegistryKey key = OpenKey(path);
     if (!key) return names;
     char name[256];
     for (DWORD index = 0;; ++index) {
         DWORD length = sizeof name;
-        if (::RegEnumKeyExA(key.Get(), index, name, &length, nullptr, nullptr, nullptr, nullptr) != ERROR_SUCCESS) break;
+        LSTATUS status = values ? ::RegEnumValueA(key.Get(), index, name, &length, nullptr, nullptr, nullptr, nullptr)
+                                : ::RegEnumKeyExA(key.Get(), index, name, &length, nullptr, nullptr, nullptr, nullptr);
+        if (status != ERROR_SUCCESS) break;
         names.insert(name);
     }
     return names;
 }
 
-// Value names of a key; the default value appears as "".
-std::set<std::string> ValueNames(const std::string& path) {
-    std::set<std::string> names;
-    UniqueRegistryKey key = OpenKey(path);
-    if (!key) return names;
-    char name[256];
-    for (DWORD index = 0;; ++index) {
-        DWORD length = sizeof name;
-        if (::RegEnumValueA(key.Get(), index, name, &length, nullptr, nullptr, nullptr, nullptr) != ERROR_SUCCESS) break;
-        names.insert(name);
-    }
-    return names;
-}
+std::set<std::string> SubkeyNames(const std::string& path) { return Names(path, false); }
+std::set<std::string> ValueNames(const std::string& path) { return Names(path, true); }
 
 void WriteString(const std::string& path, const char* valueName, const std::string& value) {
     UniqueRegistryKey key;
