@@ -8,7 +8,7 @@ export WINEDLLOVERRIDES="mscoree,mshtml="
 export WINEARCH=win64
 
 SM_PACKAGES=(cmake g++ make mingw-w64 g++-mingw-w64-x86-64-posix gcc-mingw-w64-x86-64-posix
-             mingw-w64-tools wine wine64 libwine-dev googletest libinih-dev)
+             mingw-w64-tools wine wine64 libwine-dev googletest libinih-dev ccache)
 
 sm_install_packages() {
   local missing=()
