@@ -10,7 +10,7 @@ source "$root/scripts/lib.sh"
 sm_install_packages
 sm_configure_windows
 echo "== building SessionMgr.dll and DemoClient.exe in $SM_WINDOWS_BUILD =="
-cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient scan_standard >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
+cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient VxipnpDemo simdmm_64 >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
   { cat "$SM_WINDOWS_BUILD/demo-build.log"; exit 1; }
 
 sm_start_wine
@@ -29,22 +29,12 @@ if ! timeout 60 wine regsvr32 /s "$dll" >"$out/regsvr32.txt" 2>&1; then
   exit 1
 fi
 
-# A simulated instrument setup: a VXIplug&play directory with one driver image and a configuration
-# file that names a virtual instrument and two logical names.
-setup="$out/instruments"
-mkdir -p "$setup/Win64"
-cp "$SM_WINDOWS_BUILD/sim/vxipnp/scan_standard.dll" "$setup/Win64/abc_64.dll"
-timeout 60 wine winepath -w "$setup" >"$out/instruments.winpath" 2>/dev/null || true
-setup_windows="$(tr -d '\r\n' <"$out/instruments.winpath")"
-module_path="$setup_windows\\Win64\\abc_64.dll"
-# Quoted values of the file use backslash escapes: every backslash of the path is written twice.
-printf '%s\n' \
-  '[VXIPNP Logical Names]' 'DMM1 = "VPPVInstr->BenchDMM"' '' \
-  '[VISA Logical Names]' 'Serial1 = "ASRL1::INSTR"' '' \
-  '[VPPVInstr->BenchDMM]' "ModulePath = \"${module_path//\\/\\\\}\"" 'Prefix = "abc"' \
-  'Resource = "GPIB0::14::INSTR"' 'IDQuery = True' 'Reset = True' >"$setup/Win64/QVSessionMgr.ini"
+# The simulated instruments, installed as a real installation places them: a VXIplug&play directory
+# C:\VXIPNP with the simulated driver simdmm and a configuration file that names the virtual
+# instrument BenchDMM and the logical names DMM1 and Serial1.
+sm_install_sim
 # Through the environment rather than the registry, so the prefix the tests share stays untouched.
-export VXIPNPPATH="$setup_windows"
+export VXIPNPPATH="$SM_SIM_VXIPNP_DIR_WINDOWS"
 
 status=0
 
@@ -68,6 +58,23 @@ fi
 tr -d '\r' <"$out/DemoClient.txt"
 if ! tr -d '\r' <"$out/DemoClient.txt" | grep -qx 'DemoClient finished'; then
   echo "DemoClient.exe failed"
+  status=1
+fi
+
+echo
+echo "== VXIplug&play: wine cscript examples/vxipnp-demo.vbs and wine VxipnpDemo.exe =="
+timeout 60 wine winepath -w "$root/examples/vxipnp-demo.vbs" >"$out/vxipnp-demo.vbs.winpath" 2>/dev/null || true
+script="$(tr -d '\r\n' <"$out/vxipnp-demo.vbs.winpath")"
+timeout 120 wine cscript //nologo "$script" >"$out/vxipnp-demo.vbs.txt" 2>&1 || true
+tr -d '\r' <"$out/vxipnp-demo.vbs.txt"
+if ! tr -d '\r' <"$out/vxipnp-demo.vbs.txt" | grep -qx 'vxipnp-demo.vbs finished'; then
+  echo "vxipnp-demo.vbs stopped early (a script error ends cscript silently)"
+  status=1
+fi
+timeout 120 wine "$SM_WINDOWS_BUILD/examples/VxipnpDemo.exe" >"$out/VxipnpDemo.txt" 2>&1 || status=1
+tr -d '\r' <"$out/VxipnpDemo.txt"
+if ! tr -d '\r' <"$out/VxipnpDemo.txt" | grep -qx 'VxipnpDemo finished'; then
+  echo "VxipnpDemo.exe failed"
   status=1
 fi
 

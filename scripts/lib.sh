@@ -47,3 +47,30 @@ sm_start_wine() {
 sm_stop_wine() {
   wineserver -k 2>/dev/null || true
 }
+
+# The simulated VXIplug&play drivers laid out as an installation lays out real ones, in C:\VXIPNP of
+# the prefix: Win64\Bin\<prefix>_64.dll, the session manager's Win64\QVSessionMgr.ini with the virtual
+# instrument BenchDMM (logical name DMM1), and the setup file beside the drivers. VXIPNPPATH is left
+# to the caller (the demo sets the environment variable; the registry of the test prefix stays clean).
+SM_SIM_VXIPNP_DIR_WINDOWS='C:\VXIPNP'
+sm_install_sim_vxipnp() {
+  local dir="$WINEPREFIX/drive_c/VXIPNP"
+  mkdir -p "$dir/Win64/Bin"
+  local prefix
+  for prefix in simdmm simscope simnoclose simnovpp; do
+    [ -f "$SM_WINDOWS_BUILD/sim/vxipnp/${prefix}_64.dll" ] &&
+      cp "$SM_WINDOWS_BUILD/sim/vxipnp/${prefix}_64.dll" "$dir/Win64/Bin/"
+  done
+  cp "$SM_ROOT/sim/simsetup.ini" "$dir/Win64/Bin/simsetup.ini"
+  # Quoted values of the file use backslash escapes: every backslash of the path is written twice.
+  printf '%s\r\n' \
+    '[VXIPNP Logical Names]' 'DMM1 = "VPPVInstr->BenchDMM"' '' \
+    '[VISA Logical Names]' 'Serial1 = "ASRL1::INSTR"' '' \
+    '[VPPVInstr->BenchDMM]' 'ModulePath = "C:\\VXIPNP\\Win64\\Bin\\simdmm_64.dll"' 'Prefix = "simdmm"' \
+    'Resource = "GPIB0::14::INSTR"' 'IDQuery = True' 'Reset = True' >"$dir/Win64/QVSessionMgr.ini"
+}
+
+# Every stand-in, installed into the Wine prefix the way a real installation places it.
+sm_install_sim() {
+  sm_install_sim_vxipnp
+}

@@ -8,6 +8,7 @@
 #include "sessions/CustomInstrSession.h"
 #include "sessions/DriverSession.h"
 #include "sessions/LifeTimeAlerts.h"
+#include "sessions/VXIPNPInstrSession.h"
 #include "sources/SessionName.h"
 
 namespace sm {
@@ -135,13 +136,14 @@ bool CInstrSessionMgr::FindExistingSession(std::string_view category, std::strin
 }
 
 template <class Session>
-void CInstrSessionMgr::AddSession(std::string_view category, std::string_view name, ComPtr<IInstrSession>& created) {
+Session* CInstrSessionMgr::AddSession(std::string_view category, std::string_view name, ComPtr<IInstrSession>& created) {
     auto* session = new Session();
     created = ComPtr<IInstrSession>::Attach(session->Self());
     session->SetName(DynamicString(name));
     session->SetCategory(DynamicString(category));
     session->AttachToOwner(this, inExternalProcess);
     sessions.push_back({session->Self(), session});
+    return session;
 }
 
 bool CInstrSessionMgr::CreateInstrSession(std::string_view category, std::string_view name,
@@ -171,7 +173,7 @@ bool CInstrSessionMgr::CreateInstrSession(std::string_view category, std::string
     if (is(CategoryVXIPNP)) {
         VxipnpVInstr instrument;
         if (!vxipnpInfo.FindVInstr(name, instrument)) return false;
-        AddSession<CVXIPNPInstrSession>(category, name, created);
+        AddSession<CVXIPNPInstrSession>(category, name, created)->SetVirtualInstrument(instrument);
         return true;
     }
     if (is(CategoryCUSTOM)) {

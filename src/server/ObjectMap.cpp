@@ -5,6 +5,7 @@
 #include "sessions/CustomInstrSession.h"
 #include "sessions/DriverSession.h"
 #include "sessions/VPPBase.h"
+#include "sessions/VXIPNPInstrSession.h"
 
 namespace sm {
 

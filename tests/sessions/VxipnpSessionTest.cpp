@@ -1,0 +1,236 @@
+// VXIplug&play sessions and IVPPBase through the registered DLL, over the simulated drivers copied
+// into a private VXIplug&play directory. The simdmm driver is pinned by the test (one extra
+// LoadLibrary) so that its counters survive the product freeing it.
+#include <gtest/gtest.h>
+
+#include <fstream>
+#include <string>
+
+#include "com/ComClient.h"
+#include "com/LibraryBinding.h"
+
+using namespace sm;
+using namespace sm::testing;
+
+namespace {
+const ::testing::Environment* const apartment = ::testing::AddGlobalTestEnvironment(new MultithreadedApartment);
+
+std::string Escaped(std::string path) {
+    for (std::size_t at = 0; (at = path.find('\\', at)) != std::string::npos; at += 2) path.insert(at, "\\");
+    return path;
+}
+
+const std::string bin = [] {
+    char temp[MAX_PATH];
+    ::GetTempPathA(MAX_PATH, temp);
+    std::string root = std::string(temp) + "SessionMgrVxipnpSession";
+    for (const char* folder : {"", "\\Win64", "\\Win64\\Bin"}) ::CreateDirectoryA((root + folder).c_str(), nullptr);
+    std::string bin = root + "\\Win64\\Bin";
+    for (const char* driver : {SIM_SIMDMM, SIM_SIMNOCLOSE, SIM_SIMNOVPP}) {
+        std::string name(driver);
+        ::CopyFileA(driver, (bin + "\\" + name.substr(name.find_last_of("/\\") + 1)).c_str(), FALSE);
+    }
+    auto instrument = [&](const char* name, const char* prefix, const char* resource) {
+        return std::string("[VPPVInstr->") + name + "]\nModulePath = \"" + Escaped(bin + "\\" + prefix + "_64.dll") +
+               "\"\nPrefix = \"" + prefix + "\"\nResource = \"" + resource + "\"\nIDQuery = True\nReset = False\n";
+    };
+    std::ofstream(root + "\\Win64\\QVSessionMgr.ini", std::ios::trunc)
+        << "[VXIPNP Logical Names]\nDMM1 = \"VPPVInstr->BenchDMM\"\n"
+        << instrument("BenchDMM", "simdmm", "GPIB0::14::INSTR") << instrument("WarnDMM", "simdmm", "GPIB0::15::INSTR")
+        << instrument("AbsentDMM", "simdmm", "GPIB0::99::INSTR") << instrument("NoClose", "simnoclose", "GPIB0::14::INSTR")
+        << instrument("NoVpp", "simnovpp", "GPIB0::14::INSTR") << instrument("Missing", "absent", "GPIB0::14::INSTR");
+    std::ofstream(root + "\\simsetup.ini", std::ios::trunc)
+        << "[VXIPNP Resource GPIB0::14::INSTR]\nSession = 0x1401\n"
+           "[VXIPNP Resource GPIB0::15::INSTR]\nInitStatus = 0x3FFC0101\nSession = 0x1501\n"
+           "[VXIPNP Resource GPIB0::99::INSTR]\nInitStatus = 0xBFFF0011\n"
+           "[VXIPNP Driver simdmm]\nDriverRevision = drv 1.2\nFirmwareRevision = fw 7\nSelfTestResult = -3\n"
+           "SelfTestMessage = Input relay stuck\nSelfTestStatus = 0xBFFC0800\nErrorQueryCode = -113\n"
+           "ErrorQueryMessage = Undefined header\nErrorQueryStatus = -5\nResetStatus = 0x3FFC0101\n"
+           "Message -7 = Seven\n";
+    ::SetEnvironmentVariableA("VXIPNPPATH", root.c_str());
+    ::SetEnvironmentVariableA("SM_SIM_SETUP", (root + "\\simsetup.ini").c_str());
+    return bin;
+}();
+const std::string simdmmPath = bin + "\\simdmm_64.dll";
+
+constexpr unsigned long resourceNotFound = 0xBFFF0011;
+
+class VxipnpSession : public ::testing::Test {
+protected:
+    void SetUp() override {
+        pinned.Reset(::LoadLibraryA(simdmmPath.c_str()));
+        ASSERT_TRUE(pinned);
+        GetProcAddressAs<void()>(pinned.Get(), "SimResetCounters")();
+        manager = CreateManager();
+    }
+    long Count(const char* name) { return GetProcAddressAs<long(const char*)>(pinned.Get(), "SimCounter")(name); }
+    std::string State(IInstrSession* session) {
+        UniqueBstr text;
+        EXPECT_EQ(session->get_StateDescription(text.Put()), S_OK);
+        return Text(text.Get());
+    }
+    // A failure with this HRESULT, this description and the session class's CLSID.
+    static void ExpectError(HRESULT result, unsigned long code, const std::string& description,
+                            const CLSID& classId = CLSID_VXIPNPInstrSession) {
+        EXPECT_EQ(static_cast<unsigned long>(result), code);
+        auto reported = TakeErrorInfo();
+        EXPECT_EQ(reported.description, description);
+        EXPECT_TRUE(IsEqualGUID(reported.guid, classId));
+    }
+    UniqueModule pinned;
+    ComPtr<IInstrSessionMgr> manager;
+};
+
+TEST_F(VxipnpSession, LogicalAndInstrumentNameGiveOneSessionInitializedOnce) {
+    auto byLogicalName = GetSession(manager.Get(), L"VXIPNP::DMM1");
+    auto byInstrument = GetSession(manager.Get(), L"VXIPNP::BenchDMM");
+    EXPECT_EQ(byLogicalName.Get(), byInstrument.Get());  // HasName must look at every name of the instrument
+    ASSERT_EQ(byLogicalName->Initialize(nullptr), S_OK);
+    auto options = Bstr(L"Reset=1");
+    ASSERT_EQ(byInstrument->Initialize(options.Get()), S_OK);
+    EXPECT_EQ(Count("init"), 1);
+    EXPECT_EQ(Count("init idquery"), 1);  // ID query and reset come from the file, not from the options
+    EXPECT_EQ(Count("init reset"), 0);
+}
+
+TEST_F(VxipnpSession, HandleLevelsAndReinitAfterClose) {
+    auto session = GetSession(manager.Get(), L"DMM1");
+    for (InterfaceLevel level : {DefaultInterface, SpecificDriver, IODriver}) {
+        LONG handle = 0;
+        EXPECT_EQ(session->GetHandle(level, &handle), S_OK);
+        EXPECT_EQ(handle, 0x1401);
+    }
+    UniqueVariant handleEx;
+    ASSERT_EQ(session->GetHandleEx(IODriver, handleEx.Get()), S_OK);
+    EXPECT_EQ(handleEx->vt, VT_I4);
+    EXPECT_EQ(handleEx->lVal, 0x1401);
+    LONG handle = 5;
+    ExpectError(session->GetHandle(ClassDriver, &handle), 0xFFFFBC6C, "Value invalid or out of range.");
+    EXPECT_EQ(session->GetHandle(static_cast<InterfaceLevel>(7), &handle), S_OK);
+    EXPECT_EQ(handle, 0);
+    EXPECT_EQ(Count("init"), 1);
+
+    ASSERT_EQ(session->Close(), S_OK);
+    EXPECT_EQ(Count("close"), 1);
+    EXPECT_NE(State(session.Get()).find("      Initialized: False, Loaded: True, In Process, Module Path: " + simdmmPath),
+              std::string::npos);
+    ASSERT_EQ(session->GetHandle(DefaultInterface, &handle), S_OK);
+    EXPECT_EQ(handle, 0x1401);
+    EXPECT_EQ(Count("init"), 2);
+}
+
+TEST_F(VxipnpSession, WarningOpensFailureRaisesItsStatusAndKeepsTheDriverLoaded) {
+    auto warned = GetSession(manager.Get(), L"VXIPNP::WarnDMM");
+    EXPECT_EQ(warned->Initialize(nullptr), S_OK);
+    VARIANT_BOOL initialized = VARIANT_FALSE;
+    warned->IsInitialized(&initialized);
+    EXPECT_EQ(initialized, VARIANT_TRUE);
+
+    auto absent = GetSession(manager.Get(), L"VXIPNP::AbsentDMM");
+    ExpectError(absent->Initialize(nullptr), resourceNotFound, "simdmm_init returned an error: -1073807343 (0xbfff0011).");
+    EXPECT_NE(State(absent.Get()).find("Initialized: False, Loaded: True"), std::string::npos);
+}
+
+TEST_F(VxipnpSession, LibraryFailuresAreReportedAndLeaveNothingLoaded) {
+    auto missing = GetSession(manager.Get(), L"VXIPNP::Missing");
+    EXPECT_EQ(static_cast<unsigned long>(missing->Initialize(nullptr)), 0xFFFFBD94);
+    std::string message = TakeErrorInfo().description;
+    EXPECT_EQ(message.rfind("Could not load DLL or external library '" + bin + "\\absent_64.dll'.\nWin32 Error Code = '126'\n", 0),
+              0u)
+        << message;
+
+    auto noClose = GetSession(manager.Get(), L"VXIPNP::NoClose");
+    ExpectError(noClose->Initialize(nullptr), 0xFFFFBD93,
+                "Could not find function 'simnoclose_close' in DLL (or external module) '" + bin + "\\simnoclose_64.dll'.");
+    EXPECT_NE(State(noClose.Get()).find("Initialized: False, Loaded: False"), std::string::npos);
+    EXPECT_EQ(::GetModuleHandleA("simnoclose_64.dll"), nullptr);
+}
+
+// A failed load has opened nothing: the callers' release-on-close items must survive it.
+TEST_F(VxipnpSession, FailedLoadKeepsReleaseOnCloseItems) {
+    auto missing = GetSession(manager.Get(), L"VXIPNP::Missing");
+    auto id = Bstr(L"Kept"), clsid = Bstr(L"");
+    ASSERT_EQ(missing->AttachObject(id.Get(), manager.Get(), clsid.Get(), VARIANT_TRUE), S_OK);
+    EXPECT_NE(missing->Initialize(nullptr), S_OK);
+    ComPtr<IUnknown> kept;
+    EXPECT_EQ(missing->GetObject(id.Get(), kept.Put()), S_OK);
+    EXPECT_TRUE(kept);
+}
+
+TEST_F(VxipnpSession, HandlesAreRefusedOutsideTheirProcess) {
+    auto session = GetSession(manager.Get(), L"DMM1");
+    ASSERT_EQ(session->put_InExternalProcess(VARIANT_TRUE), S_OK);
+    UniqueVariant handle;
+    ExpectError(session->GetHandleEx(DefaultInterface, handle.Get()), 0xFFFFBBA4,
+                "VXI-PNP instrument handles cannot be used outside of the operating system process that they are "
+                "created in.");
+    EXPECT_EQ(Count("init"), 0);
+}
+
+TEST_F(VxipnpSession, DestructionClosesAndFreesTheDriver) {
+    auto session = GetSession(manager.Get(), L"DMM1");
+    ASSERT_EQ(session->Initialize(nullptr), S_OK);
+    session.Reset();
+    EXPECT_EQ(Count("close"), 1);
+    pinned.Reset();
+    EXPECT_EQ(::GetModuleHandleA("simdmm_64.dll"), nullptr);  // the product's own reference is gone too
+}
+
+TEST_F(VxipnpSession, StandardFunctionsAnswerWithTheDriversResults) {
+    auto session = GetSession(manager.Get(), L"DMM1");
+    ComPtr<IVPPBase> first, second;
+    ASSERT_EQ(session->GetVPPBaseInterface(first.Put()), S_OK);
+    ASSERT_EQ(session->GetVPPBaseInterface(second.Put()), S_OK);
+    EXPECT_NE(first.Get(), second.Get());
+
+    LONG code = 0, status = 0;
+    UniqueBstr text, firmware;
+    EXPECT_EQ(first->Error_Query(&code, text.Put(), &status), S_OK);  // a negative status is a result
+    EXPECT_EQ(code, -113);
+    EXPECT_EQ(Text(text.Get()), "Undefined header");
+    EXPECT_EQ(status, -5);
+    EXPECT_EQ(second->Error_Query(&code, text.Put(), &status), S_OK);
+    EXPECT_EQ(Count("error_query"), 2);
+    EXPECT_EQ(Count("init"), 1);
+
+    EXPECT_EQ(first->Error_Message(-7, text.Put(), &status), S_OK);
+    EXPECT_EQ(Text(text.Get()), "Seven");
+    EXPECT_EQ(first->Error_Message(-8, text.Put(), &status), S_OK);
+    EXPECT_EQ(Text(text.Get()), "Unknown status code 0xFFFFFFF8");
+    EXPECT_EQ(status, 0x3FFF0085);
+    short result = 0;
+    EXPECT_EQ(first->Self_Test(&result, text.Put(), &status), S_OK);
+    EXPECT_EQ(result, -3);
+    EXPECT_EQ(Text(text.Get()), "Input relay stuck");
+    EXPECT_EQ(static_cast<unsigned long>(status), 0xBFFC0800);
+    EXPECT_EQ(first->Revision_Query(text.Put(), firmware.Put(), &status), S_OK);
+    EXPECT_EQ(Text(text.Get()) + "/" + Text(firmware.Get()), "drv 1.2/fw 7");
+    EXPECT_EQ(first->Reset(&status), S_OK);
+    EXPECT_EQ(status, 0x3FFC0101);
+}
+
+TEST_F(VxipnpSession, ResetOnAClosedSessionInitializesAndTheObjectKeepsTheSession) {
+    auto session = GetSession(manager.Get(), L"DMM1");
+    ComPtr<IVPPBase> vpp;
+    ASSERT_EQ(session->GetVPPBaseInterface(vpp.Put()), S_OK);
+    ASSERT_EQ(session->Initialize(nullptr), S_OK);
+    ASSERT_EQ(session->Close(), S_OK);
+    session.Reset();
+    LONG status = -1;
+    EXPECT_EQ(vpp->Reset(&status), S_OK);
+    EXPECT_EQ(status, 0x3FFC0101);
+    EXPECT_EQ(Count("init"), 2);
+    EXPECT_EQ(Count("close"), 1);
+    vpp.Reset();  // the last reference to the session goes with it
+    EXPECT_EQ(Count("close"), 2);
+}
+
+TEST_F(VxipnpSession, MissingStandardFunctionIsNamedAndNothingIsBound) {
+    auto session = GetSession(manager.Get(), L"VXIPNP::NoVpp");
+    ComPtr<IVPPBase> vpp;
+    ExpectError(session->GetVPPBaseInterface(vpp.Put()), 0xFFFFBD93,
+                "Could not find function 'simnovpp_reset' in DLL (or external module) '" + bin + "\\simnovpp_64.dll'.");
+    EXPECT_FALSE(vpp);
+}
+
+}  // namespace
