@@ -47,3 +47,17 @@ sm_start_wine() {
 sm_stop_wine() {
   wineserver -k 2>/dev/null || true
 }
+
+# The simulated VISA library goes where a VISA installation puts visa32.dll: the system directory, so
+# the product finds it by bare name through the normal DLL search order. No setup file is placed
+# beside it: without SM_SIM_SETUP the library sees an empty bench (VISA installed, no instrument).
+sm_install_sim_visa() {
+  local built="$SM_WINDOWS_BUILD/sim/visa/visa32.dll"
+  [ -f "$built" ] || { echo "sm_install_sim_visa: $built is not built" >&2; return 1; }
+  cp "$built" "$WINEPREFIX/drive_c/windows/system32/visa32.dll"
+}
+
+# Installs every stand-in that has an install step into the Wine prefix (which must exist).
+sm_install_sim() {
+  sm_install_sim_visa
+}

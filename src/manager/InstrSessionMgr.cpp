@@ -8,11 +8,12 @@
 #include "sessions/CustomInstrSession.h"
 #include "sessions/DriverSession.h"
 #include "sessions/LifeTimeAlerts.h"
+#include "sessions/VisaInstrSession.h"
 #include "sources/SessionName.h"
 
 namespace sm {
 
-CInstrSessionMgr::CInstrSessionMgr() {
+CInstrSessionMgr::CInstrSessionMgr() : visaInfo(vxipnpInfo) {
     for (unsigned frequency = 1000; frequency < 3000; frequency += 200) LifeTimeAlert(frequency, 10);
 }
 
@@ -135,13 +136,14 @@ bool CInstrSessionMgr::FindExistingSession(std::string_view category, std::strin
 }
 
 template <class Session>
-void CInstrSessionMgr::AddSession(std::string_view category, std::string_view name, ComPtr<IInstrSession>& created) {
+Session* CInstrSessionMgr::AddSession(std::string_view category, std::string_view name, ComPtr<IInstrSession>& created) {
     auto* session = new Session();
     created = ComPtr<IInstrSession>::Attach(session->Self());
     session->SetName(DynamicString(name));
     session->SetCategory(DynamicString(category));
     session->AttachToOwner(this, inExternalProcess);
     sessions.push_back({session->Self(), session});
+    return session;
 }
 
 bool CInstrSessionMgr::CreateInstrSession(std::string_view category, std::string_view name,
@@ -165,8 +167,8 @@ bool CInstrSessionMgr::CreateInstrSession(std::string_view category, std::string
         if (!found && multibyte::BeginsWith(name, "TCPIP", true)) found = visaInfo.ParseResource(name, entry);
         if (!found) found = visaInfo.FindLogicalName(name, entry);
         if (!found) return false;
-        // VISA sessions come with the VISA source; until then no resource is ever found.
-        return false;
+        AddSession<CVisaInstrSession>(category, name, created)->SetEntry(entry);
+        return true;
     }
     if (is(CategoryVXIPNP)) {
         VxipnpVInstr instrument;

@@ -74,7 +74,7 @@ private:
     bool FindExistingSession(std::string_view category, std::string_view name, ComPtr<IInstrSession>& found);
     bool CreateInstrSession(std::string_view category, std::string_view name, ComPtr<IInstrSession>& created);
     template <class Session>
-    void AddSession(std::string_view category, std::string_view name, ComPtr<IInstrSession>& created);
+    Session* AddSession(std::string_view category, std::string_view name, ComPtr<IInstrSession>& created);
     void MakeSessionNameUnique(SessionBase& session);
     bool IsHidden(std::string_view token) const;
 
