@@ -83,6 +83,7 @@ int Run() {
     auto queryf = reinterpret_cast<QueryfFunction*>(reinterpret_cast<void*>(::GetProcAddress(visa, "viQueryf")));
     auto write = reinterpret_cast<WriteFunction*>(reinterpret_cast<void*>(::GetProcAddress(visa, "viWrite")));
     auto read = reinterpret_cast<ReadFunction*>(reinterpret_cast<void*>(::GetProcAddress(visa, "viRead")));
+    // Only the simulated library counts its calls.
     auto opened = reinterpret_cast<long (*)(const char*)>(reinterpret_cast<void*>(::GetProcAddress(visa, "SimCounter")));
     if (!queryf || !write || !read) {
         std::printf("visa32.dll lacks viQueryf, viWrite or viRead\n");
@@ -110,11 +111,12 @@ int Run() {
     UniqueBstr state;
     if (!Check(first->get_StateDescription(state.Put()), "StateDescription")) return 1;
     std::printf("session StateDescription: %s", Narrow(state.Get()).c_str());
+    long closedBefore = opened ? opened("viClose") : 0;
     if (!Check(first->Close(), "Close")) return 1;
     VARIANT_BOOL initialized = VARIANT_TRUE;
     first->IsInitialized(&initialized);
-    std::printf("after Close: IsInitialized = %s, viClose calls = %ld\n", initialized ? "True" : "False",
-                opened ? opened("viClose") : -1);
+    std::printf("after Close: IsInitialized = %s; Close made %ld viClose calls (the handle, then its resource manager)\n",
+                initialized ? "True" : "False", opened ? opened("viClose") - closedBefore : -1);
     std::printf("VisaDemo finished\n");
     return 0;
 }

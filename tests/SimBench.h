@@ -1,5 +1,5 @@
-// Drives the stand-ins of sim/ from a test: a setup file of the test's own, and the call counters of
-// the stand-in instance the product loaded into this process.
+// Drives the stand-ins of sim/ from a test: a setup file and a configuration directory of the test's
+// own, and the call counters of the stand-in instance the product loaded into this process.
 #pragma once
 
 #include <windows.h>
@@ -11,14 +11,25 @@
 
 namespace sm::testing {
 
-// Writes the setup file `name` in the temporary folder and points SM_SIM_SETUP at it. A new name per
-// bench makes every stand-in read it afresh.
-inline void UseSimSetup(const std::string& name, const std::string& content) {
+inline std::string TempPath(const std::string& name) {
     char temp[MAX_PATH];
     ::GetTempPathA(MAX_PATH, temp);
-    std::string path = std::string(temp) + name;
-    std::ofstream(path, std::ios::trunc) << content;
-    ::SetEnvironmentVariableA("SM_SIM_SETUP", path.c_str());
+    return std::string(temp) + name;
+}
+
+// Writes the setup file `name` and points SM_SIM_SETUP at it; a new name makes every stand-in re-read.
+inline void UseSimSetup(const std::string& name, const std::string& content) {
+    std::ofstream(TempPath(name), std::ios::trunc) << content;
+    ::SetEnvironmentVariableA("SM_SIM_SETUP", TempPath(name).c_str());
+}
+
+// Points VXIPNPPATH at the folder `name`, its QVSessionMgr.ini holding `content`; gives the file's path.
+inline std::string UseConfigurationFile(const std::string& name, const std::string& content) {
+    ::CreateDirectoryA(TempPath(name).c_str(), nullptr);
+    ::CreateDirectoryA(TempPath(name + "\\Win64").c_str(), nullptr);
+    ::SetEnvironmentVariableA("VXIPNPPATH", TempPath(name).c_str());
+    std::ofstream(TempPath(name + "\\Win64\\QVSessionMgr.ini"), std::ios::trunc) << content;
+    return TempPath(name + "\\Win64\\QVSessionMgr.ini");
 }
 
 // A counter of a stand-in loaded by name ("visa32.dll"); -1 when it is not loaded.

@@ -8,22 +8,13 @@
 
 #include "CatchTE.h"
 #include "SimBench.h"
-#include "com/UniqueHandles.h"
 #include "sources/VisaInfo.h"
 
 using namespace sm;
 using namespace sm::testing;
 
 namespace {
-const std::string configuration = [] {
-    char temp[MAX_PATH];
-    ::GetTempPathA(MAX_PATH, temp);
-    std::string folder = std::string(temp) + "SessionMgrVisaInfo";
-    ::CreateDirectoryA(folder.c_str(), nullptr);
-    ::CreateDirectoryA((folder + "\\Win64").c_str(), nullptr);
-    ::SetEnvironmentVariableA("VXIPNPPATH", folder.c_str());
-    return folder + "\\Win64\\QVSessionMgr.ini";
-}();
+const std::string configuration = UseConfigurationFile("SessionMgrVisaInfo", "");
 
 // Writes the logical names and moves the file's write time on, as a later edit would.
 void WriteLogicalNames(const std::string& items, int secondsLater) {
@@ -61,11 +52,6 @@ TEST_F(VisaSource, ScanIsCachedUntilInvalidatedAndEntriesFollowTheConfigurationF
     info.InvalidateResourceList();
     EXPECT_EQ(Names(info, 3, {DynamicString("SpecificPrefix = x")}), (std::vector<std::string>{}));
     EXPECT_EQ(SimCount("visa32.dll", "viFindRsrc"), scans + 1);
-    // Every owner of the binding loads under the one per-process mutex.
-    char name[64];
-    visa::LoadingMutexName(name, ::GetCurrentProcessId());
-    UniqueKernelHandle mutex(::OpenMutexA(SYNCHRONIZE, FALSE, name));
-    EXPECT_TRUE(mutex) << name;
 }
 
 // Catches a TCPIP name refused because no scan found it, and a parsed entry FindEntry forgets.
