@@ -10,11 +10,12 @@ source "$root/scripts/lib.sh"
 sm_install_packages
 sm_configure_windows
 echo "== building SessionMgr.dll and DemoClient.exe in $SM_WINDOWS_BUILD =="
-cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient VxipnpDemo simdmm_64 >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
+cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient VxipnpDemo simdmm_64 VisaDemo sim_visa32 >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
   { cat "$SM_WINDOWS_BUILD/demo-build.log"; exit 1; }
 
 sm_start_wine
 trap sm_stop_wine EXIT
+sm_install_sim
 
 out="$SM_WINDOWS_BUILD/demo"
 mkdir -p "$out"
@@ -77,5 +78,21 @@ if ! tr -d '\r' <"$out/VxipnpDemo.txt" | grep -qx 'VxipnpDemo finished'; then
   echo "VxipnpDemo.exe failed"
   status=1
 fi
+
+echo "== VISA: examples/visa-demo.vbs and VisaDemo.exe share VISA sessions of the simulated visa32.dll =="
+# The simulated bench: the VISA library answers from sim/simsetup.ini.
+timeout 60 wine winepath -w "$root/sim/simsetup.ini" >"$out/simsetup.winpath" 2>/dev/null || true
+timeout 60 wine winepath -w "$root/examples/visa-demo.vbs" >"$out/visa-demo.vbs.winpath" 2>/dev/null || true
+export SM_SIM_SETUP="$(tr -d '\r\n' <"$out/simsetup.winpath")"
+timeout 120 wine cscript //nologo "$(tr -d '\r\n' <"$out/visa-demo.vbs.winpath")" >"$out/visa-demo.vbs.txt" 2>&1 || true
+timeout 120 wine "$SM_WINDOWS_BUILD/examples/VisaDemo.exe" >"$out/VisaDemo.txt" 2>&1 || status=1
+for piece in visa-demo.vbs VisaDemo; do
+  tr -d '\r' <"$out/$piece.txt"
+  if ! tr -d '\r' <"$out/$piece.txt" | grep -qx "$piece finished"; then
+    echo "$piece stopped early"
+    status=1
+  fi
+  echo
+done
 
 exit "$status"

@@ -70,7 +70,17 @@ sm_install_sim_vxipnp() {
     'Resource = "GPIB0::14::INSTR"' 'IDQuery = True' 'Reset = True' >"$dir/Win64/QVSessionMgr.ini"
 }
 
-# Every stand-in, installed into the Wine prefix the way a real installation places it.
+# The simulated VISA library goes where a VISA installation puts visa32.dll: the system directory, so
+# the product finds it by bare name through the normal DLL search order. No setup file is placed
+# beside it: without SM_SIM_SETUP the library sees an empty bench (VISA installed, no instrument).
+sm_install_sim_visa() {
+  local built="$SM_WINDOWS_BUILD/sim/visa/visa32.dll"
+  [ -f "$built" ] || { echo "sm_install_sim_visa: $built is not built" >&2; return 1; }
+  cp "$built" "$WINEPREFIX/drive_c/windows/system32/visa32.dll"
+}
+
+# Every stand-in, installed into the Wine prefix (which must exist) the way a real installation places it.
 sm_install_sim() {
   sm_install_sim_vxipnp
+  sm_install_sim_visa
 }

@@ -28,7 +28,9 @@ HRESULT SetComErrorInfo(REFCLSID classId, std::int32_t code, std::string_view de
 }
 
 HRESULT ReportTEException(REFCLSID classId, const TEException& exception) {
-    return SetComErrorInfo(classId, exception.GetErrorCode(), exception.GetDescription());
+    // A driver's warning status raised as an error is not negative and would read as success.
+    std::int32_t code = exception.GetErrorCode();
+    return SetComErrorInfo(classId, code < 0 ? code : TE_OPERATION_FAILED, exception.GetDescription());
 }
 
 HRESULT TranslateCurrentException(REFCLSID classId) noexcept {

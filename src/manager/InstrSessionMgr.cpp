@@ -9,11 +9,12 @@
 #include "sessions/DriverSession.h"
 #include "sessions/LifeTimeAlerts.h"
 #include "sessions/VXIPNPInstrSession.h"
+#include "sessions/VisaInstrSession.h"
 #include "sources/SessionName.h"
 
 namespace sm {
 
-CInstrSessionMgr::CInstrSessionMgr() {
+CInstrSessionMgr::CInstrSessionMgr() : visaInfo(vxipnpInfo) {
     for (unsigned frequency = 1000; frequency < 3000; frequency += 200) LifeTimeAlert(frequency, 10);
 }
 
@@ -167,8 +168,8 @@ bool CInstrSessionMgr::CreateInstrSession(std::string_view category, std::string
         if (!found && multibyte::BeginsWith(name, "TCPIP", true)) found = visaInfo.ParseResource(name, entry);
         if (!found) found = visaInfo.FindLogicalName(name, entry);
         if (!found) return false;
-        // VISA sessions come with the VISA source; until then no resource is ever found.
-        return false;
+        AddSession<CVisaInstrSession>(category, name, created)->SetEntry(entry);
+        return true;
     }
     if (is(CategoryVXIPNP)) {
         VxipnpVInstr instrument;
