@@ -10,11 +10,12 @@ source "$root/scripts/lib.sh"
 sm_install_packages
 sm_configure_windows
 echo "== building SessionMgr.dll and DemoClient.exe in $SM_WINDOWS_BUILD =="
-cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient scan_standard >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
+cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient scan_standard qvrq rqengine >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
   { cat "$SM_WINDOWS_BUILD/demo-build.log"; exit 1; }
 
 sm_start_wine
 trap sm_stop_wine EXIT
+sm_install_sim
 
 out="$SM_WINDOWS_BUILD/demo"
 mkdir -p "$out"
@@ -68,6 +69,17 @@ fi
 tr -d '\r' <"$out/DemoClient.txt"
 if ! tr -d '\r' <"$out/DemoClient.txt" | grep -qx 'DemoClient finished'; then
   echo "DemoClient.exe failed"
+  status=1
+fi
+
+echo
+echo "== Switch routes and a switch session: wine cscript examples/rq-demo.vbs =="
+timeout 60 wine winepath -w "$root/examples/rq-demo.vbs" >"$out/rq-demo.vbs.winpath" 2>/dev/null || true
+script="$(tr -d '\r\n' <"$out/rq-demo.vbs.winpath")"
+timeout 120 wine cscript //nologo "$script" >"$out/rq-demo.vbs.txt" 2>&1 || true
+tr -d '\r' <"$out/rq-demo.vbs.txt"
+if ! tr -d '\r' <"$out/rq-demo.vbs.txt" | grep -qx 'rq-demo.vbs finished'; then
+  echo "rq-demo.vbs stopped early (a script error ends cscript silently)"
   status=1
 fi
 

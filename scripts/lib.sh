@@ -47,3 +47,22 @@ sm_start_wine() {
 sm_stop_wine() {
   wineserver -k 2>/dev/null || true
 }
+
+# The switch product as its installer lays it out: "qvrq.dll" and the automation engine in the
+# system directory (the library is loaded by its bare name), the engine registered as an in-process
+# COM server, and the demo bench beside them as their default setup file. Run again, it repairs what
+# a test left hidden or unregistered.
+sm_install_sim_rq() {
+  local system32="$WINEPREFIX/drive_c/windows/system32" log="$SM_WINDOWS_BUILD/sim/rq/install.txt"
+  rm -f "$system32/qvrq.dll.hidden"
+  cp "$SM_WINDOWS_BUILD/sim/rq/qvrq.dll" "$SM_WINDOWS_BUILD/sim/rq/rqengine.dll" "$system32/"
+  cp "$SM_ROOT/sim/simsetup.ini" "$system32/simsetup.ini"
+  if ! timeout 60 wine regsvr32 /s 'C:\windows\system32\rqengine.dll' >"$log" 2>&1; then
+    echo "registering the switch engine failed:"; cat "$log"; return 1
+  fi
+}
+
+# Every stand-in placed into the Wine prefix the way a real installation places it.
+sm_install_sim() {
+  sm_install_sim_rq
+}

@@ -57,10 +57,4 @@ public:
     static constexpr const char* ClassName() { return "CVXIPNPInstrSession"; }
 };
 
-class CRQInstrSession : public DriverSession<CRQInstrSession> {
-public:
-    static const CLSID& ClassId() { return CLSID_RQInstrSession; }
-    static constexpr const char* ClassName() { return "CRQInstrSession"; }
-};
-
 }  // namespace sm
