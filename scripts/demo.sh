@@ -10,7 +10,7 @@ source "$root/scripts/lib.sh"
 sm_install_packages
 sm_configure_windows
 echo "== building SessionMgr.dll and DemoClient.exe in $SM_WINDOWS_BUILD =="
-cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient scan_standard qvrq rqengine >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
+cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient scan_standard qvrq rqengine RQDemo >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
   { cat "$SM_WINDOWS_BUILD/demo-build.log"; exit 1; }
 
 sm_start_wine
@@ -73,7 +73,11 @@ if ! tr -d '\r' <"$out/DemoClient.txt" | grep -qx 'DemoClient finished'; then
 fi
 
 echo
-echo "== Switch routes and a switch session: wine cscript examples/rq-demo.vbs =="
+echo "== Switch routes and a switch session: wine RQDemo.exe, then wine cscript examples/rq-demo.vbs =="
+if ! timeout 120 wine "$SM_WINDOWS_BUILD/examples/RQDemo.exe" >"$out/RQDemo.txt" 2>&1; then
+  status=1
+fi
+tr -d '\r' <"$out/RQDemo.txt"
 timeout 60 wine winepath -w "$root/examples/rq-demo.vbs" >"$out/rq-demo.vbs.winpath" 2>/dev/null || true
 script="$(tr -d '\r\n' <"$out/rq-demo.vbs.winpath")"
 timeout 120 wine cscript //nologo "$script" >"$out/rq-demo.vbs.txt" 2>&1 || true

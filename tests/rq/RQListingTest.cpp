@@ -52,7 +52,7 @@ TEST_F(EngineListing, ListsDevicesAndEveryAskedKindOfTheFilteredDevices) {
 
 // Catches a failing member that is ignored, or reported without the engine's error info.
 TEST_F(EngineListing, FailingMemberRaisesItsHresultWithTheInterfacesErrorInfo) {
-    UseSetup(std::string(rqBench) + "[RQ]\nEngineFailure = Routes.Count\nEngineFailureResult = 0x80040201\n");
+    UseSetup("[RQ]\nEngineFailure = Routes.Count\nEngineFailureResult = 0x80040201\n" + std::string(rqBench + 5));
     try {
         List(ReturnRoutes, {"SwitchDev1"});
         ADD_FAILURE() << "no error";
