@@ -5,13 +5,14 @@
 #include <gtest/gtest.h>
 #include <windows.h>
 
+#include <filesystem>
+#include <fstream>
 #include <string>
 #include <vector>
 
 #include "com/BstrConversion.h"
 #include "com/LibraryBinding.h"
 #include "com/UniqueHandles.h"
-#include "sources/RQEngine.h"
 
 namespace sm::testing {
 
@@ -23,18 +24,14 @@ constexpr const char* rqBench =
 // A setup file of this process's own, under a new name each time so no stand-in takes it for the last.
 inline void UseSetup(const std::string& text) {
     static int generation = 0;
-    char folder[MAX_PATH] = {};
-    ::GetTempPathA(MAX_PATH, folder);
-    std::string path = std::string(folder) + "rqbench-" + std::to_string(::GetCurrentProcessId()) + "-" +
-                       std::to_string(++generation) + ".ini";
-    UniqueKernelHandle file(::CreateFileA(path.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr));
-    DWORD written = 0;
-    ASSERT_TRUE(::WriteFile(file.Get(), text.data(), static_cast<DWORD>(text.size()), &written, nullptr));
+    std::string path = std::filesystem::temp_directory_path().string() + "\\rqbench-" +
+                       std::to_string(::GetCurrentProcessId()) + "-" + std::to_string(++generation) + ".ini";
+    std::ofstream(path) << text;
     ::SetEnvironmentVariableA("SM_SIM_SETUP", path.c_str());
 }
 
 // A counter of the stand-in `module` as loaded in this process; -1 when it is not loaded.
-inline long SimCount(const char* module, const char* name) {
+inline long SimCount(const char* name, const char* module = "qvrq.dll") {
     HMODULE loaded = ::GetModuleHandleA(module);
     auto* counter = loaded ? GetProcAddressAs<long(const char*)>(loaded, "SimCounter") : nullptr;
     return counter ? counter(name) : -1;
@@ -43,14 +40,7 @@ inline long SimCount(const char* module, const char* name) {
 // The engine unregistered by its own DllUnregisterServer, and registered again at the end.
 class EngineUnregistered {
 public:
-    EngineUnregistered() {
-        wchar_t clsid[64] = {}, path[MAX_PATH] = {};
-        ::StringFromGUID2(CLSID_RQEngine, clsid, 64);
-        LONG size = sizeof path;
-        ::RegQueryValueW(HKEY_CLASSES_ROOT, (std::wstring(L"CLSID\\") + clsid + L"\\InprocServer32").c_str(), path, &size);
-        engine = UniqueModule(::LoadLibraryW(path));
-        EXPECT_EQ(Call("DllUnregisterServer"), S_OK) << "is the engine installed (sm_install_sim)?";
-    }
+    EngineUnregistered() { EXPECT_EQ(Call("DllUnregisterServer"), S_OK) << "is the engine installed (sm_install_sim)?"; }
     ~EngineUnregistered() { EXPECT_EQ(Call("DllRegisterServer"), S_OK); }
 
 private:
@@ -58,7 +48,7 @@ private:
         auto* function = engine ? GetProcAddressAs<HRESULT()>(engine.Get(), name) : nullptr;
         return function ? function() : E_FAIL;
     }
-    UniqueModule engine;
+    UniqueModule engine{::LoadLibraryA("rqengine.dll")};
 };
 
 // "qvrq.dll" moved out of the system directory, and back.
@@ -79,13 +69,8 @@ private:
 
 inline std::vector<std::string> TextsOf(SAFEARRAY* array) {
     std::vector<std::string> texts;
-    LONG upper = -1;
-    ::SafeArrayGetUBound(array, 1, &upper);
-    for (LONG index = 0; index <= upper; ++index) {
-        UniqueBstr element;
-        ::SafeArrayGetElement(array, &index, element.Put());
-        texts.push_back(BstrToMultiByte(element.Get()));
-    }
+    for (ULONG index = 0; index < array->rgsabound[0].cElements; ++index)
+        texts.push_back(BstrToMultiByte(static_cast<BSTR*>(array->pvData)[index]));
     return texts;
 }
 
