@@ -1,6 +1,6 @@
 ' A VBScript client of the registered SessionMgr DLL showing the switch category: the routes and
-' route groups that the simulated switch product offers (sim/simsetup.ini, installed beside the
-' stand-ins by ./scripts/demo.sh) and a switch session that opens through the switch library.
+' route groups that the simulated switch product offers (sim/simsetup.ini, which ./scripts/demo.sh
+' names in SM_SIM_SETUP) and a switch session that opens through the switch library.
 '
 ' Run:  wine cscript //nologo <Windows path of this file>   (./scripts/demo.sh does it for you)
 ' The last line, "rq-demo.vbs finished", tells that the script ran to the end. Wine's VBScript cannot

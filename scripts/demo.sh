@@ -74,6 +74,9 @@ fi
 
 echo
 echo "== Switch routes and a switch session: wine RQDemo.exe, then wine cscript examples/rq-demo.vbs =="
+# The switch stand-ins read the demo bench, named through the environment like the VXIplug&play path.
+timeout 60 wine winepath -w "$root/sim/simsetup.ini" >"$out/simsetup.winpath" 2>/dev/null || true
+export SM_SIM_SETUP="$(tr -d '\r\n' <"$out/simsetup.winpath")"
 if ! timeout 120 wine "$SM_WINDOWS_BUILD/examples/RQDemo.exe" >"$out/RQDemo.txt" 2>&1; then
   status=1
 fi

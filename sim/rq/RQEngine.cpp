@@ -145,26 +145,19 @@ public:
     }
     STDMETHODIMP GetTypeInfo(UINT index, LCID, ITypeInfo** info) override {
         if (!info) return E_POINTER;
-        *info = nullptr;
-        if (index != 0) return DISP_E_BADINDEX;
-        *info = TypeInfoOf(__uuidof(Interface));
-        return *info ? S_OK : TYPE_E_ELEMENTNOTFOUND;
+        *info = index == 0 ? Info() : nullptr;
+        if (!*info) return index == 0 ? TYPE_E_ELEMENTNOTFOUND : DISP_E_BADINDEX;
+        (*info)->AddRef();
+        return S_OK;
     }
     STDMETHODIMP GetIDsOfNames(REFIID, LPOLESTR* names, UINT count, LCID, DISPID* ids) override {
-        ITypeInfo* info = TypeInfoOf(__uuidof(Interface));
-        if (!info) return TYPE_E_ELEMENTNOTFOUND;
-        HRESULT result = ::DispGetIDsOfNames(info, names, count, ids);
-        info->Release();
-        return result;
+        return Info() ? ::DispGetIDsOfNames(Info(), names, count, ids) : TYPE_E_ELEMENTNOTFOUND;
     }
     STDMETHODIMP Invoke(DISPID id, REFIID, LCID, WORD flags, DISPPARAMS* parameters, VARIANT* result,
                         EXCEPINFO* exception, UINT* argumentError) override {
-        ITypeInfo* info = TypeInfoOf(__uuidof(Interface));
-        if (!info) return TYPE_E_ELEMENTNOTFOUND;
-        HRESULT invoked = ::DispInvoke(static_cast<Interface*>(this), info, id, flags, parameters, result, exception,
-                                       argumentError);
-        info->Release();
-        return invoked;
+        if (!Info()) return TYPE_E_ELEMENTNOTFOUND;
+        return ::DispInvoke(static_cast<Interface*>(this), Info(), id, flags, parameters, result, exception,
+                            argumentError);
     }
     STDMETHODIMP InterfaceSupportsErrorInfo(REFIID iid) override {
         return iid == __uuidof(Interface) ? S_OK : S_FALSE;
@@ -172,6 +165,11 @@ public:
 
 protected:
     HRESULT Fail(const char* member) { return Failure(member, __uuidof(Interface)); }
+    // Read once per interface from the type library embedded in this DLL, and kept for the process.
+    static ITypeInfo* Info() {
+        static ITypeInfo* const info = TypeInfoOf(__uuidof(Interface));
+        return info;
+    }
 
 private:
     std::atomic<ULONG> references{1};

@@ -89,7 +89,10 @@ struct NoSwitchProduct : ::testing::Test {
         EngineUnregistered engine;
         LibraryHidden library;
     };
-    static void SetUpTestSuite() { absent = std::make_unique<Absent>(); }
+    static void SetUpTestSuite() {
+        UseSetup(rqBench);
+        absent = std::make_unique<Absent>();
+    }
     static void TearDownTestSuite() { absent.reset(); }
     static inline std::unique_ptr<Absent> absent;
 };
