@@ -81,6 +81,7 @@ if ! timeout 120 wine "$SM_WINDOWS_BUILD/examples/RQDemo.exe" >"$out/RQDemo.txt"
   status=1
 fi
 tr -d '\r' <"$out/RQDemo.txt"
+echo
 timeout 60 wine winepath -w "$root/examples/rq-demo.vbs" >"$out/rq-demo.vbs.winpath" 2>/dev/null || true
 script="$(tr -d '\r\n' <"$out/rq-demo.vbs.winpath")"
 timeout 120 wine cscript //nologo "$script" >"$out/rq-demo.vbs.txt" 2>&1 || true
