@@ -10,7 +10,7 @@ source "$root/scripts/lib.sh"
 sm_install_packages
 sm_configure_windows
 echo "== building SessionMgr.dll and DemoClient.exe in $SM_WINDOWS_BUILD =="
-cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient VxipnpDemo simdmm_64 VisaDemo sim_visa32 >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
+cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient VxipnpDemo simdmm_64 VisaDemo sim_visa32 qvrq rqengine RQDemo >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
   { cat "$SM_WINDOWS_BUILD/demo-build.log"; exit 1; }
 
 sm_start_wine
@@ -94,5 +94,23 @@ for piece in visa-demo.vbs VisaDemo; do
   fi
   echo
 done
+
+echo "== Switch routes and a switch session: wine RQDemo.exe, then wine cscript examples/rq-demo.vbs =="
+# The switch stand-ins read the demo bench, named through the environment like the VXIplug&play path.
+timeout 60 wine winepath -w "$root/sim/simsetup.ini" >"$out/simsetup.winpath" 2>/dev/null || true
+export SM_SIM_SETUP="$(tr -d '\r\n' <"$out/simsetup.winpath")"
+if ! timeout 120 wine "$SM_WINDOWS_BUILD/examples/RQDemo.exe" >"$out/RQDemo.txt" 2>&1; then
+  status=1
+fi
+tr -d '\r' <"$out/RQDemo.txt"
+echo
+timeout 60 wine winepath -w "$root/examples/rq-demo.vbs" >"$out/rq-demo.vbs.winpath" 2>/dev/null || true
+script="$(tr -d '\r\n' <"$out/rq-demo.vbs.winpath")"
+timeout 120 wine cscript //nologo "$script" >"$out/rq-demo.vbs.txt" 2>&1 || true
+tr -d '\r' <"$out/rq-demo.vbs.txt"
+if ! tr -d '\r' <"$out/rq-demo.vbs.txt" | grep -qx 'rq-demo.vbs finished'; then
+  echo "rq-demo.vbs stopped early (a script error ends cscript silently)"
+  status=1
+fi
 
 exit "$status"

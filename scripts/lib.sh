@@ -79,8 +79,23 @@ sm_install_sim_visa() {
   cp "$built" "$WINEPREFIX/drive_c/windows/system32/visa32.dll"
 }
 
+# The switch product as its installer lays it out: "qvrq.dll" and the automation engine in the
+# system directory (the library is loaded by its bare name) and the engine registered as an
+# in-process COM server. No setup file goes beside them, so the prefix's default bench is empty and
+# tests of other areas see no switch names; the demo and the tests name theirs in SM_SIM_SETUP.
+# Run again, it repairs what a test left hidden or unregistered.
+sm_install_sim_rq() {
+  local system32="$WINEPREFIX/drive_c/windows/system32" log="$SM_WINDOWS_BUILD/sim/rq/install.txt"
+  rm -f "$system32/qvrq.dll.hidden"
+  cp "$SM_WINDOWS_BUILD/sim/rq/qvrq.dll" "$SM_WINDOWS_BUILD/sim/rq/rqengine.dll" "$system32/"
+  if ! timeout 60 wine regsvr32 /s 'C:\windows\system32\rqengine.dll' >"$log" 2>&1; then
+    echo "registering the switch engine failed:"; cat "$log"; return 1
+  fi
+}
+
 # Every stand-in, installed into the Wine prefix (which must exist) the way a real installation places it.
 sm_install_sim() {
   sm_install_sim_vxipnp
   sm_install_sim_visa
+  sm_install_sim_rq
 }

@@ -26,4 +26,11 @@ inline void CheckHResult(HRESULT code) {
     if (FAILED(code)) ThrowComError(code);
 }
 
+// A failing HRESULT of a method of `object`'s interface `iid`: the thread's error info travels with
+// it only when the object says that it sets error info for that interface, so a stale one never does.
+[[noreturn]] void ThrowComErrorOf(HRESULT code, IUnknown* object, REFIID iid);
+inline void CheckMember(HRESULT code, IUnknown* object, REFIID iid) {
+    if (FAILED(code)) ThrowComErrorOf(code, object, iid);
+}
+
 }  // namespace sm

@@ -57,4 +57,13 @@ void ThrowComError(HRESULT code) {
     throw ComError(code, std::move(info));
 }
 
+void ThrowComErrorOf(HRESULT code, IUnknown* object, REFIID iid) {
+    ComPtr<IErrorInfo> info;
+    ComPtr<ISupportErrorInfo> support;
+    if (object) object->QueryInterface(IID_ISupportErrorInfo, support.PutVoid());
+    if (::GetErrorInfo(0, info.Put()) != S_OK || !support || support->InterfaceSupportsErrorInfo(iid) != S_OK)
+        info.Reset();
+    throw ComError(code, std::move(info));
+}
+
 }  // namespace sm

@@ -7,6 +7,7 @@
 #include "framework/TEException.h"
 #include "sessions/CustomInstrSession.h"
 #include "sessions/DriverSession.h"
+#include "sessions/RQInstrSession.h"
 #include "sessions/LifeTimeAlerts.h"
 #include "sessions/VXIPNPInstrSession.h"
 #include "sessions/VisaInstrSession.h"
@@ -159,6 +160,7 @@ bool CInstrSessionMgr::CreateInstrSession(std::string_view category, std::string
     }
     if (is(CategoryRQ)) {
         AddSession<CRQInstrSession>(category, name, created);
+        static_cast<CRQInstrSession*>(created.Get())->SetDeviceName(name);
         return true;
     }
     if (is(CategoryDAQ)) return false;

@@ -4,6 +4,7 @@
 #include "server/ClassFactory.h"
 #include "sessions/CustomInstrSession.h"
 #include "sessions/DriverSession.h"
+#include "sessions/RQInstrSession.h"
 #include "sessions/VPPBase.h"
 #include "sessions/VXIPNPInstrSession.h"
 

@@ -181,10 +181,5 @@ public:
     static constexpr const char* ClassName() { return "CIVIInstrSession"; }
 };
 
-class CRQInstrSession : public DriverSessionShell<CRQInstrSession> {
-public:
-    static const CLSID& ClassId() { return CLSID_RQInstrSession; }
-    static constexpr const char* ClassName() { return "CRQInstrSession"; }
-};
 
 }  // namespace sm

@@ -110,8 +110,6 @@ TEST_F(Manager, SwitchRoutesAlwaysGetASession) {
     EXPECT_EQ(CategoryOf(route.Get()), "RQ");
     EXPECT_EQ(NameOf(route.Get()), "Route1");
     EXPECT_EQ(GetSession(manager.Get(), L"rq/route1").Get(), route.Get());
-    UniqueVariant handle;
-    EXPECT_EQ(route->GetHandleEx(DefaultInterface, handle.Get()), E_NOTIMPL);
 }
 
 TEST_F(Manager, FinalReleaseRemovesTheSessionFromTheTable) {
