@@ -47,3 +47,21 @@ sm_start_wine() {
 sm_stop_wine() {
   wineserver -k 2>/dev/null || true
 }
+
+# IVI: the configuration library in the system directory (the only place the product looks), the
+# class driver where the system finds it by name, the specific driver at the module path the demo
+# bench names ("C:\Program Files\IVI Foundation\IVI\Bin\simdmm_64.dll"). No setup file goes beside
+# them, so the store is empty unless SM_SIM_SETUP names one.
+sm_install_sim_ivi() {
+  local built="$SM_WINDOWS_BUILD/sim/ivi" system="$WINEPREFIX/drive_c/windows/system32"
+  local bin="$WINEPREFIX/drive_c/Program Files/IVI Foundation/IVI/Bin"
+  [ -f "$built/iviconfig.dll" ] || return 0
+  mkdir -p "$bin"
+  cp -f "$built/iviconfig.dll" "$built/IviDmm_64.dll" "$system/"
+  cp -f "$built/simdmm_64.dll" "$bin/"
+}
+
+# Places every area's stand-ins in the prefix the way a real installation places the real libraries.
+sm_install_sim() {
+  sm_install_sim_ivi
+}

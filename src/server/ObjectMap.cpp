@@ -4,6 +4,7 @@
 #include "server/ClassFactory.h"
 #include "sessions/CustomInstrSession.h"
 #include "sessions/DriverSession.h"
+#include "sessions/IVIInstrSession.h"
 #include "sessions/VPPBase.h"
 
 namespace sm {

@@ -45,12 +45,6 @@ public:
     }
 };
 
-class CIVIInstrSession : public DriverSession<CIVIInstrSession> {
-public:
-    static const CLSID& ClassId() { return CLSID_IVIInstrSession; }
-    static constexpr const char* ClassName() { return "CIVIInstrSession"; }
-};
-
 class CVXIPNPInstrSession : public DriverSession<CVXIPNPInstrSession> {
 public:
     static const CLSID& ClassId() { return CLSID_VXIPNPInstrSession; }
