@@ -196,3 +196,14 @@ TEST_F(Ivi, StateTextOfAnIviSession) {
               "      Initialized: True, Loaded: True, Driver Type: Class, In Process, Class Module: IviDmm_64.dll, "
               "Specific Module: " + WindowsPath(SIMDMM_PATH) + "\n");
 }
+
+TEST_F(Ivi, HandlesAreRefusedInTheExternalProcessBeforeAnyDriverLoads) {
+    ASSERT_EQ(manager->put_InExternalProcess(VARIANT_TRUE), S_OK);
+    auto generator = GetSession(manager.Get(), L"IVI::Gen1");
+    ASSERT_EQ(manager->put_InExternalProcess(VARIANT_FALSE), S_OK);
+    LONG handle = -1;
+    EXPECT_EQ(static_cast<unsigned long>(generator->GetHandle(SpecificDriver, &handle)), 0xFFFFBBA4);
+    EXPECT_EQ(TakeErrorInfo().description,
+              "IVI instrument handles cannot be used outside of the operating system process that they are created in.");
+    EXPECT_EQ(SimCount(SIMDMM_NAME, "simdmm_init"), -1);
+}
