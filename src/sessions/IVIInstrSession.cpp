@@ -156,8 +156,9 @@ void CIVIInstrSession::ImplementInit(std::string_view options) {
 // ---- driver errors --------------------------------------------------------------------------------
 
 void CIVIInstrSession::RaiseDriverError(ViStatus status, const char* pattern, const char* function) {
+    // Named after the function that failed: the class driver's when it is the one loaded.
     DynamicString message(pattern);
-    message.ReplaceArg(1, entry.prefix);
+    message.ReplaceArg(1, ActivePrefix());
     message.ReplaceArg(2, status, "%d");
     message.ReplaceArg(3, static_cast<std::uint32_t>(status), "%x");
     AppendDriverErrorDetails(message, status);

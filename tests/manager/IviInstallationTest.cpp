@@ -66,12 +66,12 @@ TEST(IviInstallation, AStoreThatCannotBeOpenedIsReportedAndTriedAgain) {
               "The Quillvane Dovekit may not be installed. The installer for the Dovekit is located on the Quillvane "
               "Driver CD-ROM.\n");
     WriteSetup(Store());
-    EXPECT_EQ(ListCategories(manager.Get(), L"IVI"), (Texts{"IviDmm", "IviScope"}));
+    EXPECT_EQ(List(manager.Get(), L"IVI"), (Texts{"IviDmm", "IviScope"}));
 }
 
 TEST(IviInstallation, WithoutClassCountFunctionsEachInstrumentHasItsOneClass) {
     auto manager = CreateManager();
     // Multi's driver names no single class: its names carry an empty class before the manager's prefix.
-    EXPECT_EQ(ListNames(manager.Get(), L"IVI", ReturnVirtualInstruments | IncludeCategoryPrefix),
+    EXPECT_EQ(List(manager.Get(), L"IVI", ReturnVirtualInstruments | IncludeCategoryPrefix),
               (Texts{"IVI::IviDmm::DMM1", "IVI::::Multi", "IVI::IviScope::Bare"}));
 }
