@@ -10,7 +10,8 @@ source "$root/scripts/lib.sh"
 sm_install_packages
 sm_configure_windows
 echo "== building SessionMgr.dll and DemoClient.exe in $SM_WINDOWS_BUILD =="
-cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient VxipnpDemo simdmm_64 VisaDemo sim_visa32 qvrq rqengine RQDemo >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
+cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient VxipnpDemo simdmm_64 VisaDemo sim_visa32 qvrq rqengine RQDemo \
+  IviDemo iviconfig ividmm_class simdmm_specific >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
   { cat "$SM_WINDOWS_BUILD/demo-build.log"; exit 1; }
 
 sm_start_wine
@@ -112,5 +113,22 @@ if ! tr -d '\r' <"$out/rq-demo.vbs.txt" | grep -qx 'rq-demo.vbs finished'; then
   echo "rq-demo.vbs stopped early (a script error ends cscript silently)"
   status=1
 fi
+
+
+echo "== IVI over the bench sim/simsetup.ini: wine IviDemo.exe, then wine cscript examples/ivi-demo.vbs =="
+# The stand-ins read the bench named by SM_SIM_SETUP; without it the IVI store is empty.
+timeout 60 wine winepath -w "$root/examples/ivi-demo.vbs" >"$out/ivi-demo.vbs.winpath" 2>/dev/null || true
+timeout 60 wine winepath -w "$root/sim/simsetup.ini" >"$out/simsetup.winpath" 2>/dev/null || true
+bench="$(tr -d '\r\n' <"$out/simsetup.winpath")"
+SM_SIM_SETUP="$bench" timeout 120 wine "$SM_WINDOWS_BUILD/examples/IviDemo.exe" >"$out/IviDemo.txt" 2>&1 || true
+SM_SIM_SETUP="$bench" timeout 120 wine cscript //nologo "$(tr -d '\r\n' <"$out/ivi-demo.vbs.winpath")" \
+  >"$out/ivi-demo.vbs.txt" 2>&1 || true
+for file in IviDemo.txt:'IviDemo finished' ivi-demo.vbs.txt:'ivi-demo.vbs finished'; do
+  tr -d '\r' <"$out/${file%%:*}"
+  if ! tr -d '\r' <"$out/${file%%:*}" | grep -qx "${file#*:}"; then
+    echo "${file%%:*}: the client stopped early"
+    status=1
+  fi
+done
 
 exit "$status"

@@ -93,9 +93,24 @@ sm_install_sim_rq() {
   fi
 }
 
+# IVI: the configuration library in the system directory (the only place the product looks), the
+# class driver where the system finds it by name, the specific driver at the module path the demo
+# bench names ("C:\Program Files\IVI Foundation\IVI\Bin\simdmm_64.dll"). No setup file goes beside
+# them, so the store is empty unless SM_SIM_SETUP names one.
+sm_install_sim_ivi() {
+  local built="$SM_WINDOWS_BUILD/sim/ivi" system="$WINEPREFIX/drive_c/windows/system32"
+  local bin="$WINEPREFIX/drive_c/Program Files/IVI Foundation/IVI/Bin"
+  [ -f "$built/iviconfig.dll" ] || return 0
+  mkdir -p "$bin"
+  cp -f "$built/iviconfig.dll" "$built/IviDmm_64.dll" "$system/"
+  cp -f "$built/simdmm_64.dll" "$bin/"
+}
+
+
 # Every stand-in, installed into the Wine prefix (which must exist) the way a real installation places it.
 sm_install_sim() {
   sm_install_sim_vxipnp
   sm_install_sim_visa
   sm_install_sim_rq
+  sm_install_sim_ivi
 }

@@ -8,6 +8,7 @@
 #include "sessions/CustomInstrSession.h"
 #include "sessions/DriverSession.h"
 #include "sessions/RQInstrSession.h"
+#include "sessions/IVIInstrSession.h"
 #include "sessions/LifeTimeAlerts.h"
 #include "sessions/VXIPNPInstrSession.h"
 #include "sessions/VisaInstrSession.h"
@@ -127,9 +128,7 @@ bool CInstrSessionMgr::FindExistingSession(std::string_view category, std::strin
                                            ComPtr<IInstrSession>& found) {
     CriticalSectionGuard guard(lock);
     for (const TableEntry& entry : sessions) {
-        DynamicString sessionCategory;
-        entry.base->GetCategory(sessionCategory);
-        if (!IsAnyCategory(category) && !SameCategory(category, sessionCategory.View())) continue;
+        if (!IsAnyCategory(category) && !SameCategory(category, entry.base->Category().View())) continue;
         if (!entry.base->HasName(name)) continue;
         found = ComPtr<IInstrSession>(entry.session);
         return true;
@@ -156,6 +155,7 @@ bool CInstrSessionMgr::CreateInstrSession(std::string_view category, std::string
         IviEntry entry;
         if (!iviInfo.FindEntry(name, entry)) return false;
         AddSession<CIVIInstrSession>(category, name, created);
+        static_cast<CIVIInstrSession*>(sessions.back().base)->SetEntry(entry);
         return true;
     }
     if (is(CategoryRQ)) {

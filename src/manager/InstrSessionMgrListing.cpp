@@ -86,9 +86,8 @@ SAFEARRAY* CInstrSessionMgr::GetSessionListSafeArray(std::string_view argument) 
     DynamicString category, subCategory;
     SplitCategoryArgument(argument, category, subCategory);
     for (std::size_t index = kept.size(); index-- > 0;) {
-        DynamicString sessionCategory;
-        kept[index].base->GetCategory(sessionCategory);
-        bool categoryMatches = IsAnyCategory(category.View()) || SameCategory(category.View(), sessionCategory.View());
+        bool categoryMatches =
+            IsAnyCategory(category.View()) || SameCategory(category.View(), kept[index].base->Category().View());
         if (!categoryMatches || !kept[index].base->AcceptsSubcategory(subCategory.View()))
             kept.erase(kept.begin() + static_cast<std::ptrdiff_t>(index));
     }

@@ -5,6 +5,7 @@
 #include "sessions/CustomInstrSession.h"
 #include "sessions/DriverSession.h"
 #include "sessions/RQInstrSession.h"
+#include "sessions/IVIInstrSession.h"
 #include "sessions/VPPBase.h"
 #include "sessions/VXIPNPInstrSession.h"
 

@@ -40,6 +40,8 @@ public:
 
     virtual void GetName(String& result) const { result.Assign(name); }
     virtual void GetCategory(String& result) const { result.Assign(category); }
+    // The category as the session was created with it; GetCategory may add a sub-category.
+    const String& Category() const { return category; }
     virtual void SetName(const String& value) { name.Assign(value); }
     virtual void SetCategory(const String& value) { category.Assign(value); }
     virtual bool HasName(std::string_view candidate) const;

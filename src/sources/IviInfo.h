@@ -1,23 +1,69 @@
-// IVI logical names and virtual instruments from the IVI configuration store. The store is not
-// consulted yet: the source knows no names or sub-categories, so every lookup answers "not configured".
+// IVI logical names and virtual instruments from the machine's IVI configuration store, read
+// through the configuration library "iviconfig.dll" in the system directory. Each virtual
+// instrument gives one entry per IVI class of its driver; the init defaults come from the session
+// manager's configuration file. The entries are read again whenever the store or the file changed.
 #pragma once
 
+#include <cstdint>
+#include <string_view>
+
+#include "com/DriverLibrary.h"
 #include "sources/InfoBase.h"
+#include "sources/IviEntry.h"
 
 namespace sm {
 
-// An IVI logical name or virtual instrument, as handed to a new IVI session.
-struct IviEntry {
-    DynamicString name;
-};
-
 class IviInfo : public InfoBase {
 public:
+    IviInfo() = default;
+    IviInfo(const IviInfo&) = delete;
+    IviInfo& operator=(const IviInfo&) = delete;
+    ~IviInfo() override;
+
     void ListNames(std::string_view subCategory, std::uint32_t options, const StringVector& filters,
                    StringVector& names) override;
     void ListCategories(std::string_view subCategory, StringVector& categories) override;
+
+    // The current entries, read again when the store or the configuration file changed.
+    const IviEntryList& GetEntries(std::int32_t* generation = nullptr);
+    // GetEntries, then the first entry that answers to name, copied out.
     bool FindEntry(std::string_view name, IviEntry& found);
     void AppendStateDescription(String& text);
+
+private:
+    using Handle = void*;
+    using Status = std::int32_t;
+    struct Functions {
+        Status (*closeIniFile)(Handle, std::int32_t) = nullptr;
+        Status (*openIniFile)(const char*, Handle*) = nullptr;
+        Status (*configurationChanged)(Handle, unsigned char*) = nullptr;
+        Status (*reloadConfiguration)(Handle) = nullptr;
+        Status (*getNumberOfVIs)(Handle, std::int32_t*) = nullptr;
+        Status (*getNthVI)(Handle, std::int32_t, const char**) = nullptr;
+        Status (*getVIDriver)(Handle, const char*, char*, std::int32_t) = nullptr;
+        Status (*getDriverPrefix)(Handle, const char*, char*, std::int32_t) = nullptr;
+        Status (*getDriverModule)(Handle, const char*, char*, std::int32_t) = nullptr;
+        Status (*getDriverClass)(Handle, const char*, char*, std::int32_t) = nullptr;
+        Status (*getDriverClassCount)(Handle, const char*, std::int32_t*) = nullptr;
+        Status (*getDriverClassByIndex)(Handle, const char*, std::int32_t, char*, std::int32_t) = nullptr;
+        Status (*getNumberOfLogicalNames)(Handle, std::int32_t*) = nullptr;
+        Status (*getNthLogicalName)(Handle, std::int32_t, const char**) = nullptr;
+        Status (*getLogicalNameVI)(Handle, const char*, char*, std::int32_t) = nullptr;
+    };
+
+    void LoadFunctionPointers();
+    void UnloadLibrary();
+    Handle GetIviIniHandle(std::int32_t* generation);
+    void ReadEntries(Handle handle, IviEntryList& target);
+    void ApplyFileSettings(IviEntryList& target);
+    const StringVector& GetClasses();
+
+    IviEntryList entries;
+    std::int32_t entriesGeneration = 0;
+    StringVector classes;
+    std::int32_t classesGeneration = 0;
+    DriverLibrary library;
+    Functions functions;
 };
 
 }  // namespace sm

@@ -1,0 +1,204 @@
+// IVI names and sessions through real COM, over the stand-in IVI configuration library and IVI-C
+// drivers installed in the prefix. The store is this program's own setup file; the configuration
+// file with the init defaults lives in a VXIplug&play directory of its own.
+#include "IviSupport.h"
+
+using namespace sm;
+using namespace sm::testing;
+
+namespace {
+const ::testing::Environment* const apartment = ::testing::AddGlobalTestEnvironment(new MultithreadedApartment);
+
+constexpr LONG logicalAndVirtual = ReturnLogicalNames | ReturnVirtualInstruments;
+
+std::string WindowsPath(std::string path) {
+    for (char& c : path) c = c == '/' ? '\\' : c;
+    return "Z:" + path;
+}
+
+// The store: DMM1 (IviDmm, logical names MyDmm and Bench), Gen1 (IviFgen: no class driver
+// installed), Multi (IviDmm repeated and IviSwtch), Meter2 (another prefix), Bare (no class).
+std::string Store(int changeCount, const std::string& drivers = "", const std::string& extra = "") {
+    std::string module = WindowsPath(SIMDMM_PATH);
+    return "[IVI]\nChangeCount = " + std::to_string(changeCount) +
+           "\n[IVI Instrument DMM1]\nDriverSession = SimDmm\n[IVI Instrument Gen1]\nDriverSession = SimGen\n"
+           "[IVI Instrument Multi]\nDriverSession = SimMulti\n[IVI Instrument Meter2]\nDriverSession = Meter\n"
+           "[IVI Instrument Bare]\nDriverSession = Classless\n" + extra +
+           "[IVI DriverSession SimDmm]\nPrefix = simdmm\nClass = IviDmm\nModule = " + module +
+           "\n[IVI DriverSession SimGen]\nPrefix = simdmm\nClass = IviFgen\nModule = " + module +
+           "\n[IVI DriverSession SimMulti]\nPrefix = simdmm\nClasses = IviDmm, IviDmm, IviSwtch\nModule = " + module +
+           "\n[IVI DriverSession Meter]\nPrefix = ag34401\nClass = IviDmm\nModule = C:\\none\\ag34401_64.dll\n"
+           "[IVI DriverSession Classless]\nPrefix = bare\nClass = IviScope\nClasses =\n"
+           "[IVI LogicalNames]\nMyDmm = dmm1\nBench = DMM1\n" + drivers;
+}
+
+const bool benchWritten = [] {
+    WriteSetup(Store(1));
+    char temp[MAX_PATH] = {};
+    ::GetTempPathA(MAX_PATH, temp);
+    std::string root = std::string(temp) + "SessionMgrIviTest";
+    ::CreateDirectoryA(root.c_str(), nullptr);
+    ::CreateDirectoryA((root + "\\Win64").c_str(), nullptr);
+    std::ofstream(root + "\\Win64\\QVSessionMgr.ini", std::ios::trunc)
+        << "[VInstr->DMM1]\nIDQuery = 0\n[VInstr->IviSwtch::Multi]\nReset = False\n";
+    ::SetEnvironmentVariableA("VXIPNPPATH", root.c_str());
+    return true;
+}();
+
+class Ivi : public ::testing::Test {
+protected:
+    void SetUp() override {
+        ASSERT_TRUE(benchWritten);
+        manager = CreateManager();
+        ASSERT_TRUE(manager);
+    }
+    LONG Handle(IInstrSession* session, InterfaceLevel level) {
+        UniqueVariant handle;
+        EXPECT_EQ(session->GetHandleEx(level, handle.Get()), S_OK) << TakeErrorInfo().description;
+        EXPECT_EQ(handle.Get()->vt, VT_I4);
+        return handle.Get()->lVal;
+    }
+    ComPtr<IInstrSessionMgr> manager;
+};
+}  // namespace
+
+TEST_F(Ivi, NamesByOptionClassPrefixSubCategoryAndFilter) {
+    EXPECT_EQ(List(manager.Get(), L"IVI", logicalAndVirtual),
+              (Texts{"DMM1", "MyDmm", "Bench", "Gen1", "Multi", "Multi", "Meter2"}));
+    EXPECT_EQ(List(manager.Get(), L"IVI", ReturnLogicalNames), (Texts{"MyDmm", "Bench"}));
+    EXPECT_EQ(List(manager.Get(), L"IVI::IviDmm", ReturnVirtualInstruments | ReturnHiddenNames),
+              (Texts{"DMM1", "VInstr->DMM1", "Multi", "VInstr->Multi", "Meter2", "VInstr->Meter2"}));
+    EXPECT_EQ(List(manager.Get(), L"IVI::IviFgen", logicalAndVirtual | IncludeCategoryPrefix),
+              (Texts{"IVI::IviFgen::Gen1"}));
+    EXPECT_EQ(List(manager.Get(), L"IVI", ReturnVirtualInstruments, L"SpecificPrefix = AG34401"), Texts{"Meter2"});
+    EXPECT_EQ(List(manager.Get(), L"IVI", logicalAndVirtual, L"Foo=1"), Texts{});
+    // Repeated classes give one entry each; an instrument without a class is nowhere.
+    EXPECT_EQ(List(manager.Get(), L"IVI"), (Texts{"IviDmm", "IviFgen", "IviSwtch"}));
+    EXPECT_EQ(List(manager.Get(), L"IVI::IviDmm"), Texts{});
+    auto bare = Bstr(L"IVI::Bare");
+    ComPtr<IInstrSession> none;
+    EXPECT_EQ(static_cast<unsigned long>(manager->GetInstrSession(bare.Get(), VARIANT_FALSE, none.Put())), 0xFFFFBC68);
+}
+
+TEST_F(Ivi, StoreIsReadOnceUntilItsChangeCountMoves) {
+    List(manager.Get(), L"IVI", logicalAndVirtual);
+    long reads = SimCount("iviconfig.dll", "IviIni_GetNumberOfVIs");
+    List(manager.Get(), L"IVI", logicalAndVirtual);
+    List(manager.Get(), L"IVI");
+    EXPECT_EQ(SimCount("iviconfig.dll", "IviIni_GetNumberOfVIs"), reads);
+    WriteSetup(Store(2, "", "[IVI Instrument Late]\nDriverSession = SimGen\n"));
+    EXPECT_EQ(List(manager.Get(), L"IVI::IviFgen", ReturnVirtualInstruments), (Texts{"Gen1", "Late"}));
+    EXPECT_EQ(SimCount("iviconfig.dll", "IviIni_GetNumberOfVIs"), reads + 1);
+    WriteSetup(Store(3));
+    EXPECT_EQ(List(manager.Get(), L"IVI::IviFgen", ReturnVirtualInstruments), (Texts{"Gen1"}));
+}
+
+TEST_F(Ivi, SessionAnswersToEveryNameOfItsInstrumentAndCarriesItsClass) {
+    auto session = GetSession(manager.Get(), L"IVI::IviDmm::MyDmm");
+    ASSERT_TRUE(session);
+    EXPECT_EQ(NameOf(session.Get()), "MyDmm");
+    EXPECT_EQ(CategoryOf(session.Get()), "IVI::IviDmm");
+    for (const wchar_t* other : {L"IVI::DMM1", L"VInstr->DMM1", L"IVI::Bench", L"ivi::ividmm::dmm1"})
+        EXPECT_EQ(GetSession(manager.Get(), other).Get(), session.Get()) << Text(Bstr(other).Get());
+    // The class qualifier picks the entry: Multi through IviSwtch is another session than through IviDmm.
+    auto switchEntry = GetSession(manager.Get(), L"IVI::IviSwtch::Multi");
+    EXPECT_EQ(CategoryOf(switchEntry.Get()), "IVI::IviSwtch");
+    EXPECT_NE(GetSession(manager.Get(), L"IVI::IviDmm::Multi").Get(), switchEntry.Get());
+    auto listed = Bstr(L"IVI::IviSwtch");
+    UniqueSafeArray sessions;
+    ASSERT_EQ(manager->GetSessions(listed.Get(), sessions.Put()), S_OK);
+    EXPECT_EQ(sessions.Get()->rgsabound[0].cElements, 1u);
+}
+
+TEST_F(Ivi, InitDefaultsComeFromTheFileSectionsPerInstrumentAndPerClass) {
+    auto dmm = GetSession(manager.Get(), L"IVI::DMM1");
+    ASSERT_EQ(dmm->Initialize(nullptr), S_OK) << TakeErrorInfo().description;
+    // Named after the instrument, the session opens its first logical name.
+    EXPECT_EQ(SimCount("IviDmm_64.dll", "IviDmm_InitWithOptions(MyDmm,0,1,)"), 1);
+    auto switchEntry = GetSession(manager.Get(), L"IVI::IviSwtch::Multi");
+    auto empty = Bstr(L"");
+    ASSERT_EQ(switchEntry->Initialize(empty.Get()), S_OK) << TakeErrorInfo().description;
+    // No IviSwtch class driver: the specific driver, with the instrument's name as resource.
+    EXPECT_EQ(SimCount(SIMDMM_NAME, "simdmm_InitWithOptions(Multi,1,0,)"), 1);
+}
+
+TEST_F(Ivi, OptionsAreTakenOutOfTheStringAndInitRunsOncePerOpening) {
+    auto session = GetSession(manager.Get(), L"IVI::IviDmm::Multi");
+    auto options = Bstr(L"IdQuery=false, Simulate=1"), reset = Bstr(L"Reset=true");
+    ASSERT_EQ(session->Initialize(options.Get()), S_OK) << TakeErrorInfo().description;
+    ASSERT_EQ(session->Initialize(options.Get()), S_OK);
+    EXPECT_EQ(SimCount("IviDmm_64.dll", "IviDmm_InitWithOptions(Multi,0,1, Simulate=1)"), 1);
+    ASSERT_EQ(session->Close(), S_OK);
+    EXPECT_EQ(SimCount("IviDmm_64.dll", "IviDmm_close"), 1);
+    ASSERT_EQ(session->Initialize(reset.Get()), S_OK);
+    EXPECT_EQ(SimCount("IviDmm_64.dll", "IviDmm_InitWithOptions(Multi,1,1,)"), 1);
+}
+
+TEST_F(Ivi, HandlesByLevelWithAndWithoutClassDriver) {
+    WriteSetup(Store(3, "[IVI Driver simdmm]\nSession = 0x5005\nIoSession = 0x6006\n"));
+    auto dmm = GetSession(manager.Get(), L"IVI::MyDmm");
+    EXPECT_EQ(Handle(dmm.Get(), DefaultInterface), 0x1001);
+    EXPECT_EQ(Handle(dmm.Get(), ClassDriver), 0x1001);
+    EXPECT_EQ(Handle(dmm.Get(), SpecificDriver), 0x3003);
+    EXPECT_EQ(Handle(dmm.Get(), IODriver), 0x2002);
+    auto generator = GetSession(manager.Get(), L"IVI::Gen1");
+    LONG plain = -1;
+    EXPECT_EQ(generator->GetHandle(ClassDriver, &plain), S_OK);
+    EXPECT_EQ(plain, 0);
+    EXPECT_EQ(Handle(generator.Get(), SpecificDriver), 0x5005);
+    EXPECT_EQ(Handle(generator.Get(), IODriver), 0x6006);
+    ComPtr<IUnknown> driver;
+    EXPECT_EQ(static_cast<unsigned long>(generator->GetCOMDriver(IODriver, driver.Put())), 0xFFFFBBA4);
+}
+
+TEST_F(Ivi, ClassDriverWithoutOptionalFunctions) {
+    // Loaded afresh for this session: the stand-in drops the listed functions at load.
+    WriteSetup(Store(3, "[IVI Driver IviDmm]\nMissing = InitWithOptions, GetSpecificDriverCHandle, GetAttributeViSession\n"));
+    auto dmm = GetSession(manager.Get(), L"IVI::MyDmm");
+    EXPECT_EQ(Handle(dmm.Get(), SpecificDriver), 0);
+    EXPECT_EQ(SimCount("IviDmm_64.dll", "IviDmm_init(MyDmm,0,1)"), 1);
+    LONG handle = -1;
+    EXPECT_EQ(static_cast<unsigned long>(dmm->GetHandle(IODriver, &handle)), 0xFFFFBBA4);
+    EXPECT_EQ(TakeErrorInfo().description, "Operation Failed.");
+}
+
+// The message names the function that failed: the class driver's, not the specific driver's prefix.
+TEST_F(Ivi, DriverErrorsCarryTheStatusAndTheDriversOwnTexts) {
+    WriteSetup(Store(3, "[IVI Driver IviDmm]\nInitStatus = -1\nErrorText = Simulated failure\n"));
+    auto dmm = GetSession(manager.Get(), L"IVI::DMM1");
+    EXPECT_EQ(static_cast<unsigned long>(dmm->Initialize(nullptr)), 0xFFFFFFFF);
+    EXPECT_EQ(TakeErrorInfo().description, "IviDmm_InitWithOptions returned an error: -1 (0xffffffff). Simulated failure");
+    // Without a GetError text: error_message, then GetErrorInfo's codes and elaboration.
+    WriteSetup(Store(3, "[IVI Driver IviDmm]\nInitStatus = 0xBFFF0011\nErrorMessage = Bad thing\n"
+                        "PrimaryError = -5\nSecondaryError = 7\nElaboration = More\n"));
+    EXPECT_EQ(static_cast<unsigned long>(dmm->Initialize(nullptr)), 0xBFFF0011);
+    EXPECT_EQ(TakeErrorInfo().description, "IviDmm_InitWithOptions returned an error: -1073807343 (0xbfff0011). Bad "
+                                           "thing Primary Error Code: -5. Secondary Error Code: 7. More");
+    // A failed init left the library loaded: the next call only tries init again.
+    WriteSetup(Store(3));
+    EXPECT_EQ(dmm->Initialize(nullptr), S_OK);
+    EXPECT_EQ(SimCount("IviDmm_64.dll", "IviDmm_InitWithOptions"), 3);
+}
+
+TEST_F(Ivi, StateTextOfAnIviSession) {
+    auto dmm = GetSession(manager.Get(), L"IVI::MyDmm");
+    ASSERT_EQ(dmm->Initialize(nullptr), S_OK);
+    UniqueBstr state;
+    ASSERT_EQ(dmm->get_StateDescription(state.Put()), S_OK);
+    EXPECT_EQ(Text(state.Get()),
+              "   Name: MyDmm, Category: IVI::IviDmm\nName List: DMM1 (VirtualInstrumentName), VInstr->DMM1 "
+              "(VirtualInstrumentName, DoNotDisplayName), MyDmm (LogicalName), Bench (LogicalName)\n"
+              "      Initialized: True, Loaded: True, Driver Type: Class, In Process, Class Module: IviDmm_64.dll, "
+              "Specific Module: " + WindowsPath(SIMDMM_PATH) + "\n");
+}
+
+TEST_F(Ivi, HandlesAreRefusedInTheExternalProcessBeforeAnyDriverLoads) {
+    ASSERT_EQ(manager->put_InExternalProcess(VARIANT_TRUE), S_OK);
+    auto generator = GetSession(manager.Get(), L"IVI::Gen1");
+    ASSERT_EQ(manager->put_InExternalProcess(VARIANT_FALSE), S_OK);
+    LONG handle = -1;
+    EXPECT_EQ(static_cast<unsigned long>(generator->GetHandle(SpecificDriver, &handle)), 0xFFFFBBA4);
+    EXPECT_EQ(TakeErrorInfo().description,
+              "IVI instrument handles cannot be used outside of the operating system process that they are created in.");
+    EXPECT_EQ(SimCount(SIMDMM_NAME, "simdmm_init"), -1);
+}
