@@ -10,7 +10,7 @@ source "$root/scripts/lib.sh"
 sm_install_packages
 sm_configure_windows
 echo "== building SessionMgr.dll and DemoClient.exe in $SM_WINDOWS_BUILD =="
-cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient scan_standard >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
+cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient scan_standard ExternalProcessServer ExternalDemoClient >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
   { cat "$SM_WINDOWS_BUILD/demo-build.log"; exit 1; }
 
 sm_start_wine
@@ -28,6 +28,7 @@ if ! timeout 60 wine regsvr32 /s "$dll" >"$out/regsvr32.txt" 2>&1; then
   cat "$out/regsvr32.txt"
   exit 1
 fi
+sm_register_external_server
 
 # A simulated instrument setup: a VXIplug&play directory with one driver image and a configuration
 # file that names a virtual instrument and two logical names.
@@ -70,5 +71,17 @@ if ! tr -d '\r' <"$out/DemoClient.txt" | grep -qx 'DemoClient finished'; then
   echo "DemoClient.exe failed"
   status=1
 fi
+
+echo
+echo "== Two client processes, one session: wine ExternalDemoClient.exe first & second =="
+# Both start at once; the first request starts the shared external-process server, which leaves
+# after its last client.
+external_client="$SM_WINDOWS_BUILD/examples/ExternalDemoClient.exe"
+timeout 120 wine "$external_client" first >"$out/ExternalDemoClient.first.txt" 2>&1 &
+first_pid=$!
+timeout 120 wine "$external_client" second >"$out/ExternalDemoClient.second.txt" 2>&1 || status=1
+wait "$first_pid" || status=1
+tr -d '\r' <"$out/ExternalDemoClient.first.txt"
+tr -d '\r' <"$out/ExternalDemoClient.second.txt"
 
 exit "$status"

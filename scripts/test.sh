@@ -17,4 +17,5 @@ echo "== native tests (sanitized) =="
 echo "== Windows tests under Wine =="
 sm_start_wine
 trap sm_stop_wine EXIT
+sm_register_external_server
 (cd "$SM_WINDOWS_BUILD" && ctest --output-on-failure)
