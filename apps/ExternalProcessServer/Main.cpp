@@ -18,11 +18,14 @@ namespace sm {
 namespace {
 
 // One server per machine session. Two clients that activate at once may make COM start two
-// servers; the second one waits here for the first to end and otherwise leaves. It must stay a
-// while before leaving: COM asks again for the class object only after about a second, and a
-// started server that has already gone makes that client's activation fail.
+// servers; the second one waits here a moment for the first to end and otherwise leaves. It must
+// not leave before the first has registered its class object and the second's client has asked
+// again (COM asks about once a second): a started server that has gone fails that activation.
 constexpr const wchar_t* instanceMutexName = L"Local\\SessionMgr.ExternalProcessServer";
+constexpr const wchar_t* readyEventName = L"Local\\SessionMgr.ExternalProcessServer.Ready";
 constexpr DWORD duplicateWaitMilliseconds = 3000;
+constexpr DWORD duplicateReadyWaitMilliseconds = 60000;
+constexpr DWORD duplicateLingerMilliseconds = 2500;
 constexpr DWORD lifetimePollMilliseconds = 200;
 
 bool HasSwitch(const wchar_t* commandLine, const wchar_t* name) {
@@ -36,8 +39,14 @@ bool HasSwitch(const wchar_t* commandLine, const wchar_t* name) {
 int Serve() {
     UniqueKernelHandle instance(::CreateMutexW(nullptr, FALSE, instanceMutexName));
     if (!instance) return 2;
+    UniqueKernelHandle ready(::CreateEventW(nullptr, TRUE, FALSE, readyEventName));
+    if (!ready) return 2;
     DWORD waited = ::WaitForSingleObject(instance.Get(), duplicateWaitMilliseconds);
-    if (waited != WAIT_OBJECT_0 && waited != WAIT_ABANDONED) return 0;
+    if (waited != WAIT_OBJECT_0 && waited != WAIT_ABANDONED) {
+        ::WaitForSingleObject(ready.Get(), duplicateReadyWaitMilliseconds);
+        ::Sleep(duplicateLingerMilliseconds);
+        return 0;
+    }
 
     int exitCode = 0;
     if (FAILED(::CoInitializeEx(nullptr, COINIT_MULTITHREADED))) {
@@ -50,7 +59,9 @@ int Serve() {
                                                REGCLS_MULTIPLEUSE, &cookie))) {
                 exitCode = 4;
             } else {
+                ::SetEvent(ready.Get());
                 while (!ServerLifetime::Instance().ShouldExit(GetModuleLockCount())) ::Sleep(lifetimePollMilliseconds);
+                ::ResetEvent(ready.Get());
                 ::CoRevokeClassObject(cookie);
             }
         }

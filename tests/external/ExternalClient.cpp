@@ -1,8 +1,7 @@
 // A client process of the shared external process, driven by its command line: each argument is
-// one step (get=*CUSTOM::Station, attach=Id:5, lock=unique:10, wait=Event, ...). Every step prints
-// one line of results; the test that started the process reads them from its output file.
+// one step (get=*CUSTOM::Station, attach=Id:5, lock=unique:10, wait=Event, ...) and prints one line
+// that the test reads from the process's output file.
 #include <windows.h>
-#include <ole2.h>
 
 #include <cstdio>
 #include <cstdlib>
@@ -19,28 +18,16 @@ using namespace sm;
 
 namespace {
 
-constexpr DWORD eventWaitMilliseconds = 90000;
-
 UniqueBstr Bstr(const std::string& text) { return UniqueBstr(AnsiToBstr(text)); }
+std::string Text(BSTR text) { return BstrToMultiByte(text); }
 
 std::string Description() {
     ComPtr<IErrorInfo> info;
-    if (::GetErrorInfo(0, info.Put()) != S_OK || !info) return "<none>";
     UniqueBstr text;
-    info->GetDescription(text.Put());
-    std::string result = BstrToMultiByte(text.Get());
-    for (std::size_t at = 0; (at = result.find('\n', at)) != std::string::npos;) result.replace(at, 1, "\\n");
+    if (::GetErrorInfo(0, info.Put()) != S_OK || FAILED(info->GetDescription(text.Put()))) return "<none>";
+    std::string result = Text(text.Get());
+    for (std::size_t at; (at = result.find('\n')) != std::string::npos;) result.replace(at, 1, "\\n");
     return result;
-}
-
-void Print(const char* format, auto... values) {
-    std::printf(format, values...);
-    std::printf("\n");
-    std::fflush(stdout);
-}
-
-UniqueKernelHandle Event(const std::string& name) {
-    return UniqueKernelHandle(::CreateEventA(nullptr, TRUE, FALSE, ("Local\\SmExternalTest." + name).c_str()));
 }
 
 ComPtr<IExternalProcessServer> Server() {
@@ -50,170 +37,125 @@ ComPtr<IExternalProcessServer> Server() {
     return server;
 }
 
-ComPtr<IInstrSessionMgr> ExternalManager(IExternalProcessServer* server) {
-    ComPtr<IUnknown> created;
-    auto clsid = Bstr("{7D4A10B1-2C88-4E21-B3F6-91E5A07D2C3B}");
-    auto iid = Bstr("{7D4A10B0-2C88-4E21-B3F6-91E5A07D2C3B}");
-    if (server) server->CreateObjectInServer(clsid.Get(), iid.Get(), created.Put());
-    return created ? created.As<IInstrSessionMgr>() : ComPtr<IInstrSessionMgr>();
-}
-
 struct Client {
     ComPtr<IInstrSessionMgr> manager;
     ComPtr<IInstrSession> session;
     // Open until the process ends, so a signal set before the other side opens it is not lost.
     std::map<std::string, UniqueKernelHandle> events;
 
-    HANDLE EventHandle(const std::string& name) {
-        auto& handle = events[name];
-        if (!handle) handle = Event(name);
-        return handle.Get();
+    HANDLE Event(const std::string& name) {
+        auto& event = events[name];
+        if (!event) event.Reset(::CreateEventA(nullptr, TRUE, FALSE, ("Local\\SmExternalTest." + name).c_str()));
+        return event.Get();
     }
 
-    int Run(const std::string& step) {
-        std::size_t equals = step.find('=');
-        std::string verb = step.substr(0, equals);
-        std::string argument = equals == std::string::npos ? "" : step.substr(equals + 1);
+    bool Run(const std::string& verb, const std::string& argument) {
         std::string first = argument.substr(0, argument.find(':'));
-        std::string second = argument.find(':') == std::string::npos ? "" : argument.substr(argument.find(':') + 1);
-
+        std::string second = argument.substr(first.size() + (first.size() < argument.size() ? 1 : 0));
+        auto text = Bstr(first);
+        bool needsSession = verb == "attach" || verb == "read" || verb == "lock" || verb == "unlock" || verb == "break";
+        if (needsSession && !session) return !std::printf("%s: no session\n", verb.c_str());
         if (verb == "get") {
-            auto name = Bstr(argument);
-            HRESULT result = manager->GetInstrSession(name.Get(), VARIANT_FALSE, session.Put());
-            Print("get %s hr=0x%08lx desc=%s", argument.c_str(), result, FAILED(result) ? Description().c_str() : "");
-        } else if (verb == "name") {
+            HRESULT result = manager->GetInstrSession(Bstr(argument).Get(), VARIANT_FALSE, session.Put());
             UniqueBstr name;
             VARIANT_BOOL external = VARIANT_FALSE;
+            if (FAILED(result)) return std::printf("get %s hr=0x%08lx desc=%s\n", argument.c_str(), result, Description().c_str());
             session->get_Name(name.Put());
             session->get_InExternalProcess(&external);
-            Print("name=%s external=%d", BstrToMultiByte(name.Get()).c_str(), external);
+            std::printf("get %s hr=0x%08lx name=%s external=%d\n", argument.c_str(), result, Text(name.Get()).c_str(), external);
         } else if (verb == "attach") {
-            auto id = Bstr(first);
-            Print("attach hr=0x%08lx", session->AttachLong(id.Get(), std::atol(second.c_str())));
+            std::printf("attach hr=0x%08lx\n", session->AttachLong(text.Get(), std::atol(second.c_str())));
         } else if (verb == "read") {
-            auto id = Bstr(argument);
             LONG value = 0;
-            HRESULT result = session->GetLong(id.Get(), &value);
-            Print("read hr=0x%08lx value=%ld", result, value);
+            HRESULT result = session->GetLong(text.Get(), &value);
+            std::printf("read hr=0x%08lx value=%ld\n", result, value);
         } else if (verb == "lock") {
-            UniqueBstr key;
-            if (first == "unique")
-                manager->GetUniqueKeyName(key.Put());
-            else
-                key = Bstr(first);
-            HRESULT result = session->LockSession(key.Get(), std::atof(second.c_str()), 0);
-            Print("lock %s hr=0x%08lx", second.c_str(), result);
+            if (first == "unique") manager->GetUniqueKeyName(text.Put());
+            std::printf("lock %s hr=0x%08lx\n", second.c_str(), session->LockSession(text.Get(), std::atof(second.c_str()), 0));
         } else if (verb == "unlock") {
-            Print("unlock hr=0x%08lx", session->UnlockSession());
-        } else if (verb == "lockstate") {
-            UniqueBstr owner;
-            LONG level = 0;
-            session->GetLockState(owner.Put(), &level);
-            Print("lockstate owner=%s level=%ld", BstrToMultiByte(owner.Get()).c_str(), level);
+            std::printf("unlock hr=0x%08lx\n", session->UnlockSession());
         } else if (verb == "break") {
-            // A lock left by a process that has gone: the owner key is known, any client may unwind it.
+            // A lock left by a process that has gone: any client may unwind it, level by level.
             UniqueBstr owner;
             LONG level = 0;
             session->GetLockState(owner.Put(), &level);
             for (LONG unwound = 0; unwound < level; ++unwound) session->UnlockSession();
-            Print("break owner=%s levels=%ld", BstrToMultiByte(owner.Get()).c_str(), level);
+            std::printf("break owner=%s levels=%ld\n", Text(owner.Get()).c_str(), level);
         } else if (verb == "sessions") {
-            auto category = Bstr(argument);
             UniqueSafeArray list;
-            HRESULT result = manager->GetSessions(category.Get(), list.Put());
+            HRESULT result = manager->GetSessions(text.Get(), list.Put());
             LONG upper = -1;
             if (list) ::SafeArrayGetUBound(list.Get(), 1, &upper);
-            Print("sessions %s hr=0x%08lx count=%ld", argument.c_str(), result, upper + 1);
+            std::printf("sessions %s hr=0x%08lx count=%ld\n", argument.c_str(), result, upper + 1);
         } else if (verb == "describe") {
-            UniqueBstr text;
-            HRESULT result = manager->get_StateDescription(text.Put());
-            std::string description = BstrToMultiByte(text.Get());
-            std::size_t local = description.find("In Process State:\n");
-            std::size_t external = description.find("Out of Process State:\n");
-            Print("describe hr=0x%08lx local=%d external=%d externalAfterLocal=%d names=%d", result,
-                  local != std::string::npos, external != std::string::npos,
-                  local != std::string::npos && external != std::string::npos && external > local,
-                  description.find(argument) != std::string::npos);
+            UniqueBstr state;
+            HRESULT result = manager->get_StateDescription(state.Put());
+            std::string all = Text(state.Get());
+            std::size_t local = all.find("In Process State:\n"), external = all.find("Out of Process State:\n");
+            std::printf("describe hr=0x%08lx local=%d externalAfterLocal=%d names=%d\n", result, local != std::string::npos,
+                        external != std::string::npos && external > local, all.find(argument, external) != std::string::npos);
         } else if (verb == "alerts") {
+            // The external manager's own view, reached as the manager reaches it.
             manager->put_AudibleLifeTimeAlerts(argument == "1" ? VARIANT_TRUE : VARIANT_FALSE);
-            auto external = ExternalManager(Server().Get());
+            ComPtr<IUnknown> created;
             VARIANT_BOOL value = VARIANT_FALSE;
-            HRESULT result = external ? external->get_AudibleLifeTimeAlerts(&value) : E_POINTER;
-            Print("alerts hr=0x%08lx external=%d", result, value);
+            Server()->CreateObjectInServer(Bstr("{7D4A10B1-2C88-4E21-B3F6-91E5A07D2C3B}").Get(),
+                                           Bstr("{7D4A10B0-2C88-4E21-B3F6-91E5A07D2C3B}").Get(), created.Put());
+            HRESULT result = created.As<IInstrSessionMgr>()->get_AudibleLifeTimeAlerts(&value);
+            std::printf("alerts hr=0x%08lx external=%d\n", result, value);
         } else if (verb == "server") {
-            auto server = Server();
             LONG processId = 0, clients = 0;
-            if (server) {
-                server->get_ProcessId(&processId);
-                server->get_ClientProcessCount(&clients);
-            }
-            Print("server pid=%ld clients=%ld", processId, clients);
+            auto server = Server();
+            server->get_ProcessId(&processId);
+            server->get_ClientProcessCount(&clients);
+            std::printf("server pid=%ld clients=%ld\n", processId, clients);
         } else if (verb == "foreign") {
-            ForeignClass();
-        } else if (verb == "release") {
-            session.Reset();
-            Print("released");
+            // A class that is not ours, early-bound and then late-bound (DISPID 7).
+            auto server = Server();
+            auto foreign = Bstr("{00020424-0000-0000-C000-000000000046}"), iid = Bstr("{00000000-0000-0000-C000-000000000046}");
+            ComPtr<IUnknown> object;
+            HRESULT early = server->CreateObjectInServer(foreign.Get(), iid.Get(), object.Put());
+            std::printf("foreign vtable hr=0x%08lx desc=%s\n", early, Description().c_str());
+            VARIANT arguments[2] = {};  // last argument first
+            arguments[0].vt = arguments[1].vt = VT_BSTR;
+            arguments[0].bstrVal = iid.Get();
+            arguments[1].bstrVal = foreign.Get();
+            DISPPARAMS parameters = {arguments, nullptr, 2, 0};
+            UniqueVariant result;
+            EXCEPINFO exception = {};
+            HRESULT late = server->Invoke(7, IID_NULL, 0, DISPATCH_METHOD, &parameters, result.Get(), &exception, nullptr);
+            UniqueBstr description(exception.bstrDescription), source(exception.bstrSource), help(exception.bstrHelpFile);
+            std::printf("foreign dispatch hr=0x%08lx scode=0x%08lx desc=%s\n", late, exception.scode, Text(description.Get()).c_str());
         } else if (verb == "signal") {
-            ::SetEvent(EventHandle(argument));
+            ::SetEvent(Event(argument));
         } else if (verb == "wait") {
-            if (::WaitForSingleObject(EventHandle(argument), eventWaitMilliseconds) != WAIT_OBJECT_0) {
-                Print("wait %s timed out", argument.c_str());
-                return 3;
-            }
+            if (::WaitForSingleObject(Event(argument), 90000) != WAIT_OBJECT_0) return !std::printf("wait %s timed out\n", argument.c_str());
         } else if (verb == "crash") {
             // Gone without releasing anything and without CoUninitialize, as a crashed client is.
             ::TerminateProcess(::GetCurrentProcess(), 9);
         } else {
-            Print("unknown step %s", step.c_str());
-            return 2;
+            return !std::printf("unknown step %s\n", verb.c_str());
         }
-        return 0;
-    }
-
-    // A class that is not one of ours, asked for early-bound and late-bound.
-    static void ForeignClass() {
-        auto server = Server();
-        auto foreign = Bstr("{00020424-0000-0000-C000-000000000046}");
-        auto unknown = Bstr("{00000000-0000-0000-C000-000000000046}");
-        ComPtr<IUnknown> object;
-        ::SetErrorInfo(0, nullptr);
-        HRESULT early = server->CreateObjectInServer(foreign.Get(), unknown.Get(), object.Put());
-        Print("foreign vtable hr=0x%08lx desc=%s", early, Description().c_str());
-
-        DISPID member = 0;
-        wchar_t name[] = L"CreateObjectInServer";
-        LPOLESTR names[] = {name};
-        server->GetIDsOfNames(IID_NULL, names, 1, LOCALE_USER_DEFAULT, &member);
-        VARIANT arguments[2];
-        arguments[0].vt = VT_BSTR;  // reverse order: the IID text, then the CLSID text
-        arguments[0].bstrVal = unknown.Get();
-        arguments[1].vt = VT_BSTR;
-        arguments[1].bstrVal = foreign.Get();
-        DISPPARAMS parameters = {arguments, nullptr, 2, 0};
-        UniqueVariant result;
-        EXCEPINFO exception = {};
-        HRESULT late = server->Invoke(member, IID_NULL, LOCALE_USER_DEFAULT, DISPATCH_METHOD, &parameters,
-                                      result.Get(), &exception, nullptr);
-        std::string description = BstrToMultiByte(exception.bstrDescription);
-        ::SysFreeString(exception.bstrDescription);
-        ::SysFreeString(exception.bstrSource);
-        ::SysFreeString(exception.bstrHelpFile);
-        Print("foreign dispatch hr=0x%08lx scode=0x%08lx desc=%s", late, exception.scode, description.c_str());
+        return true;
     }
 };
 
 }  // namespace
 
 int main(int argc, char** argv) {
+    std::setvbuf(stdout, nullptr, _IONBF, 0);
     if (FAILED(::CoInitializeEx(nullptr, COINIT_MULTITHREADED))) return 4;
-    int exitCode = 0;
+    bool succeeded = true;
     {
         Client client;
-        if (FAILED(::CoCreateInstance(CLSID_InstrSessionMgr, nullptr, CLSCTX_INPROC_SERVER, IID_IInstrSessionMgr,
-                                      client.manager.PutVoid())))
-            exitCode = 5;
-        for (int index = 1; index < argc && exitCode == 0; ++index) exitCode = client.Run(argv[index]);
+        succeeded = SUCCEEDED(::CoCreateInstance(CLSID_InstrSessionMgr, nullptr, CLSCTX_INPROC_SERVER,
+                                                 IID_IInstrSessionMgr, client.manager.PutVoid()));
+        for (int index = 1; index < argc && succeeded; ++index) {
+            std::string step = argv[index];
+            std::size_t equals = step.find('=');
+            succeeded = client.Run(step.substr(0, equals), equals == std::string::npos ? "" : step.substr(equals + 1));
+        }
     }
     ::CoUninitialize();
-    return exitCode;
+    return succeeded ? 0 : 3;
 }

@@ -1,8 +1,3 @@
-' Reads, from a script process, the data item that a C++ client process attached to the shared
-' session "*CUSTOM::Station" in the external process.
-Dim manager, session
-Set manager = CreateObject("SessionMgr.InstrSessionMgr")
-Set session = manager.GetInstrSession("*CUSTOM::Station", False)
-WScript.Echo "read=" & session.GetLong("Counter")
-WScript.Echo "name=" & session.Name
-WScript.Echo "fails=0"
+' Reads, from a script process, the item a C++ client process attached to "*CUSTOM::Station".
+Set session = CreateObject("SessionMgr.InstrSessionMgr").GetInstrSession("*CUSTOM::Station", False)
+WScript.Echo "read=" & session.GetLong("Counter") & " name=" & session.Name
