@@ -11,7 +11,8 @@ sm_install_packages
 sm_configure_windows
 echo "== building SessionMgr.dll and DemoClient.exe in $SM_WINDOWS_BUILD =="
 cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient VxipnpDemo simdmm_64 VisaDemo sim_visa32 qvrq rqengine RQDemo \
-  IviDemo iviconfig ividmm_class simdmm_specific >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
+  IviDemo iviconfig ividmm_class simdmm_specific \
+  ExternalProcessServer ExternalDemoClient sessionmgr >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
   { cat "$SM_WINDOWS_BUILD/demo-build.log"; exit 1; }
 
 sm_start_wine
@@ -30,6 +31,7 @@ if ! timeout 60 wine regsvr32 /s "$dll" >"$out/regsvr32.txt" 2>&1; then
   cat "$out/regsvr32.txt"
   exit 1
 fi
+sm_register_external_server
 
 # The simulated instruments, installed as a real installation places them: a VXIplug&play directory
 # C:\VXIPNP with the simulated driver simdmm and a configuration file that names the virtual
@@ -130,5 +132,16 @@ for file in IviDemo.txt:'IviDemo finished' ivi-demo.vbs.txt:'ivi-demo.vbs finish
     status=1
   fi
 done
+
+echo "== Two client processes, one session: wine ExternalDemoClient.exe first & second =="
+# Both start at once; the first request starts the shared external-process server, which leaves
+# after its last client.
+external_client="$SM_WINDOWS_BUILD/examples/ExternalDemoClient.exe"
+timeout 120 wine "$external_client" first >"$out/ExternalDemoClient.first.txt" 2>&1 &
+first_pid=$!
+timeout 120 wine "$external_client" second >"$out/ExternalDemoClient.second.txt" 2>&1 || status=1
+wait "$first_pid" || status=1
+tr -d '\r' <"$out/ExternalDemoClient.first.txt"
+tr -d '\r' <"$out/ExternalDemoClient.second.txt"
 
 exit "$status"

@@ -114,3 +114,16 @@ sm_install_sim() {
   sm_install_sim_rq
   sm_install_sim_ivi
 }
+
+# Registers the shared external-process server (a local COM server EXE) in the current prefix, the
+# way an installation does: the server registers itself. The DLL's own registration (regsvr32)
+# supplies the type library that marshals the server's interface.
+sm_register_external_server() {
+  local server="$SM_WINDOWS_BUILD/apps/ExternalProcessServer/ExternalProcessServer.exe"
+  local log="$SM_WINDOWS_BUILD/external-server-registration.txt"
+  if ! timeout 60 wine "$server" /RegServer >"$log" 2>&1; then
+    echo "ExternalProcessServer.exe /RegServer failed:"
+    cat "$log"
+    return 1
+  fi
+}

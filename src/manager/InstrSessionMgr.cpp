@@ -26,8 +26,14 @@ CInstrSessionMgr::~CInstrSessionMgr() {
     // never owned a reference and are not released here.
     sessions.clear();
     for (unsigned frequency = 3000; frequency > 1000; frequency -= 200) LifeTimeAlert(frequency, 10);
-    externalServer[0].Reset();
-    externalServer[1].Reset();
+    // While the process goes away the proxies' channels may already be gone: a release would have
+    // to call out to the server and could hang the exit. The server notices the ended process.
+    for (auto& server : externalServer) {
+        if (IsModuleDetaching())
+            server.Detach();
+        else
+            server.Reset();
+    }
 }
 
 // The singleton factory keeps one reference for the life of the process. Only references beyond

@@ -299,6 +299,7 @@ TEST_F(TypeLibraryFixture, LibraryHoldsExactlyTheContractTypes)
         {L"IVIInstrSession", TKIND_COCLASS},  {L"VXIPNPInstrSession", TKIND_COCLASS},
         {L"VisaInstrSession", TKIND_COCLASS}, {L"CustomInstrSession", TKIND_COCLASS},
         {L"RQInstrSession", TKIND_COCLASS},   {L"VPPBase", TKIND_COCLASS},
+        {L"IExternalProcessServer", TKIND_DISPATCH},
     };
     std::vector<std::pair<std::wstring, int>> actual;
     for (UINT i = 0; i < lib_->GetTypeInfoCount(); ++i) {

@@ -137,16 +137,6 @@ TEST_F(Manager, OutputIsClearedWhenCreationFails) {
     TakeErrorInfo();
 }
 
-TEST_F(Manager, ExternalPrefixIsForwardedAndFailsWithoutTheServer) {
-    ComPtr<IInstrSession> session;
-    auto text = Bstr(L"*CUSTOM::Remote");
-    HRESULT result = manager->GetInstrSession(text.Get(), VARIANT_FALSE, session.Put());
-    EXPECT_EQ(result, E_POINTER);
-    EXPECT_FALSE(session);
-    EXPECT_EQ(TakeErrorInfo().description,
-              "An error occurred creating the session manager in the external process.\nRestart Verentis to recover.\n");
-}
-
 TEST_F(Manager, AnExternalManagerServesPrefixedNamesItself) {
     ASSERT_EQ(manager->put_InExternalProcess(VARIANT_TRUE), S_OK);
     auto session = GetSession(manager.Get(), L"*CUSTOM::Remote");
