@@ -86,6 +86,7 @@ SAFEARRAY* CInstrSessionMgr::GetSessionListSafeArray(std::string_view argument) 
     DynamicString category, subCategory;
     SplitCategoryArgument(argument, category, subCategory);
     for (std::size_t index = kept.size(); index-- > 0;) {
+        CriticalSectionGuard sessionGuard(kept[index].base->objectLock);  // its category may change meanwhile
         DynamicString sessionCategory;
         kept[index].base->GetCategory(sessionCategory);
         bool categoryMatches = IsAnyCategory(category.View()) || SameCategory(category.View(), sessionCategory.View());

@@ -10,7 +10,8 @@ namespace sm {
 template <class Session>
 class DriverSession : public InstrSession<Session> {
 public:
-    ~DriverSession() override { this->CloseForDestruction(); }
+    // Nothing beyond the common close work yet: no driver is opened.
+    void FinalClose() { InstrSession<Session>::FinalClose(); }
 
     STDMETHODIMP Initialize(BSTR) override { return E_NOTIMPL; }
     STDMETHODIMP IsInitialized(VARIANT_BOOL* result) override {
