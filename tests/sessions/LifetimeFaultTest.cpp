@@ -1,6 +1,7 @@
 // The final release of a session whose close work touches the session's own count.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cstdint>
 
 #include "com/ComClient.h"
@@ -12,15 +13,17 @@ namespace {
 const ::testing::Environment* const apartment = ::testing::AddGlobalTestEnvironment(new MultithreadedApartment);
 
 int closeRuns = 0;
-ULONG countSeenInsideClose = 0;
+ULONG lowestCountInsideClose = 0;
 
 // What any smart pointer or script wrapper does with the session it is handed.
 void __stdcall TakeAndDropOwnReference(IInstrSession* closing) {
     ++closeRuns;
-    ComPtr<IUnknown> unknown;
-    closing->QueryInterface(IID_IUnknown, unknown.PutVoid());
+    void* unknown = nullptr;
+    closing->QueryInterface(IID_IUnknown, &unknown);
+    ULONG afterQuery = static_cast<IUnknown*>(unknown)->Release();
     closing->AddRef();
-    countSeenInsideClose = closing->Release();
+    ULONG afterAddRef = closing->Release();
+    lowestCountInsideClose = std::min(afterQuery, afterAddRef);
 }
 }  // namespace
 
@@ -38,5 +41,5 @@ TEST(FinalRelease, CloseFunctionMayTakeAndDropAReferenceToItsSession) {
 
     session.Reset();
     EXPECT_EQ(closeRuns, 1);
-    EXPECT_NE(countSeenInsideClose, 0u);
+    EXPECT_NE(lowestCountInsideClose, 0u);
 }
