@@ -1,5 +1,7 @@
 #include "com/ErrorBoundary.h"
 
+#include <new>
+
 #include "com/BstrConversion.h"
 #include "com/ComError.h"
 #include "com/ComPtr.h"
@@ -42,11 +44,18 @@ HRESULT TranslateCurrentException(REFCLSID classId) noexcept {
         } catch (const ComError& error) {
             ::SetErrorInfo(0, error.ErrorInfo());
             return error.Error();
+        } catch (const std::bad_alloc&) {
+            // Clients handle running out of memory by its standard code; making a message would
+            // need memory too.
+            ::SetErrorInfo(0, nullptr);
+            return E_OUTOFMEMORY;
         } catch (...) {
             return SetComErrorInfo(classId, TE_OPERATION_FAILED, GetTEErrorMessage(TE_OPERATION_FAILED));
         }
+    } catch (const std::bad_alloc&) {
+        // Reporting itself ran out of memory: the code alone must still get out.
+        return E_OUTOFMEMORY;
     } catch (...) {
-        // Reporting itself failed (no memory for the message): the code alone must still get out.
         return static_cast<HRESULT>(TE_OPERATION_FAILED);
     }
 }

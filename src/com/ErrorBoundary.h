@@ -2,6 +2,7 @@
 // ComBoundary, so every failure reaches the client the same way:
 //   TEException  -> its code as the HRESULT, error info with the class's CLSID and the message;
 //   ComError     -> its own HRESULT and error info;
+//   std::bad_alloc -> E_OUTOFMEMORY without error info;
 //   anything else-> -17500 with "Operation Failed.".
 #pragma once
 

@@ -117,7 +117,9 @@ Path DirectoryGetter::GetPublicDirectory(std::string_view subKey, bool view64) {
     std::lock_guard guard(lock);
     auto cacheKey = std::make_pair(std::string(subKey), view64);
     if (auto cached = customPublic.find(cacheKey); cached != customPublic.end()) return cached->second;
-    Path found = CustomLocation("CustomPublicLocation", subKey, view64).value_or(GetPublicDirectory());
+    // The default is computed only when no custom location wins: its failure must not break one.
+    std::optional<Path> custom = CustomLocation("CustomPublicLocation", subKey, view64);
+    Path found = custom ? *custom : GetPublicDirectory();
     customPublic.emplace(std::move(cacheKey), found);
     return found;
 }
@@ -126,7 +128,8 @@ Path DirectoryGetter::GetConfigDirectory(std::string_view subKey, bool view64) {
     std::lock_guard guard(lock);
     auto cacheKey = std::make_pair(std::string(subKey), view64);
     if (auto cached = config.find(cacheKey); cached != config.end()) return cached->second;
-    Path found = CustomLocation("CfgLocation", subKey, view64).value_or(GetDefaultConfigDirectory());
+    std::optional<Path> custom = CustomLocation("CfgLocation", subKey, view64);
+    Path found = custom ? *custom : GetDefaultConfigDirectory();
     config.emplace(std::move(cacheKey), found);
     return found;
 }

@@ -673,7 +673,7 @@ bool IniObj::Get(std::string_view section, std::string_view item, String& value)
 bool IniObj::Get(std::string_view section, std::string_view item, Path& value) const {
     const ItemEntry* entry = FindItem(section, item);
     if (!entry) return false;
-    std::string text = UnescapeIniText(entry->value);
+    std::string text = UnescapeIniPath(entry->value);
     // A cut path would name another file.
     if (text.size() > Path::capacity) RaiseIniError("IniObj::Get", InvalidPath);
     value.Assign(text);
@@ -775,6 +775,21 @@ std::string UnescapeIniText(std::string_view text) {
             }
             default: decoded += c;
         }
+    }
+    return decoded;
+}
+
+std::string UnescapeIniPath(std::string_view text) {
+    std::string decoded;
+    decoded.reserve(text.size());
+    for (std::size_t offset = 0; offset < text.size();) {
+        std::size_t bytes = multibyte::CharBytes(text, offset);
+        bool escape = bytes == 1 && text[offset] == '\\' && offset + 1 < text.size() &&
+                      (text[offset + 1] == '\\' || text[offset + 1] == '"');
+        if (escape) ++offset;  // the escaping backslash; the character after it is kept below
+        bytes = multibyte::CharBytes(text, offset);
+        decoded.append(text.substr(offset, bytes));
+        offset += bytes;
     }
     return decoded;
 }

@@ -100,7 +100,7 @@ public:
     bool Get(std::string_view section, std::string_view item, String& value) const;
     // Value exactly as stored.
     bool GetRaw(std::string_view section, std::string_view item, String& value) const;
-    // Decoded value as a path; a value too long for a path raises the InvalidPath engine error.
+    // Value as a path (UnescapeIniPath); a value too long for a path raises the InvalidPath engine error.
     bool Get(std::string_view section, std::string_view item, Path& value) const;
     // "True" or "False" in any case. Empty or blank counts as missing. Any other value gives false
     // like a missing item and sets *invalidValue (the InvalidBooleanValue engine error, not raised).
@@ -133,5 +133,8 @@ std::string EscapeIniText(std::string_view text);
 // stays an "x"; a backslash before any other character gives that character; one at the very end
 // is dropped.
 std::string UnescapeIniText(std::string_view text);
+// Path values are written by hand with single backslashes ("C:\new\tools") as well as by the writer
+// with escaped ones: only "\\" and "\"" are escapes, every other backslash stays as it stands.
+std::string UnescapeIniPath(std::string_view text);
 
 }  // namespace sm

@@ -134,7 +134,11 @@ bool CInstrSessionMgr::FindExistingSession(std::string_view category, std::strin
                                            ComPtr<IInstrSession>& found) {
     CriticalSectionGuard guard(lock);
     for (const TableEntry& entry : sessions) {
-        if (!IsAnyCategory(category) && !SameCategory(category, entry.base->Category().View())) continue;
+        // Name and category are read under the session's lock: another thread may be renaming it. The
+        // category compared is the one the session was created with (an IVI session shows its class too).
+        CriticalSectionGuard sessionGuard(entry.base->objectLock);
+        DynamicString sessionCategory(entry.base->Category().View());
+        if (!IsAnyCategory(category) && !SameCategory(category, sessionCategory.View())) continue;
         if (!entry.base->HasName(name)) continue;
         found = ComPtr<IInstrSession>(entry.session);
         return true;
@@ -205,17 +209,24 @@ void CInstrSessionMgr::MakeSessionNameUnique(SessionBase& session) {
     CriticalSectionGuard guard(lock);
     std::size_t noted = sessions.size();
     DynamicString base;
-    session.GetName(base);
+    {
+        CriticalSectionGuard sessionGuard(session.objectLock);
+        session.GetName(base);
+    }
     for (std::int64_t counter = 2;; ++counter) {
         DynamicString candidate(base);
         candidate.Append("_").AppendInteger(counter);
         bool taken = false;
         for (std::size_t index = 0; index < noted && !taken; ++index) {
             DynamicString existing;
-            sessions[index].base->GetName(existing);
+            {
+                CriticalSectionGuard sessionGuard(sessions[index].base->objectLock);
+                sessions[index].base->GetName(existing);
+            }
             taken = existing.Compare(candidate.View(), true) == 0;
         }
         if (!taken) {
+            CriticalSectionGuard sessionGuard(session.objectLock);
             session.SetName(candidate);
             return;
         }
@@ -269,10 +280,12 @@ STDMETHODIMP CInstrSessionMgr::GetUniqueKeyName(BSTR* keyName) {
     *keyName = nullptr;
     return ManagerCall([&] {
         ++uniqueKeyCounter;
+        // Fixed-width fields: run together without separators, numbers of varying width let two
+        // processes (or two counters and ticks) form the same digits.
         DynamicString key("Lock");
-        key.AppendInteger(uniqueKeyCounter);
-        key.AppendUnsigned(::GetTickCount());
-        key.AppendUnsigned(::GetCurrentProcessId());
+        key.AppendUnsigned(static_cast<std::uint32_t>(uniqueKeyCounter), "%010u");
+        key.AppendUnsigned(::GetTickCount(), "%010u");
+        key.AppendUnsigned(::GetCurrentProcessId(), "%010u");
         *keyName = AllocSysString(key);
     });
 }

@@ -86,8 +86,9 @@ SAFEARRAY* CInstrSessionMgr::GetSessionListSafeArray(std::string_view argument) 
     DynamicString category, subCategory;
     SplitCategoryArgument(argument, category, subCategory);
     for (std::size_t index = kept.size(); index-- > 0;) {
-        bool categoryMatches =
-            IsAnyCategory(category.View()) || SameCategory(category.View(), kept[index].base->Category().View());
+        CriticalSectionGuard sessionGuard(kept[index].base->objectLock);  // its category may change meanwhile
+        DynamicString sessionCategory(kept[index].base->Category().View());
+        bool categoryMatches = IsAnyCategory(category.View()) || SameCategory(category.View(), sessionCategory.View());
         if (!categoryMatches || !kept[index].base->AcceptsSubcategory(subCategory.View()))
             kept.erase(kept.begin() + static_cast<std::ptrdiff_t>(index));
     }

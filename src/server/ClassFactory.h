@@ -11,7 +11,8 @@
 namespace sm {
 
 // Reference counting shared by both factories. Class objects live in the object map until the
-// process detaches, so they never count in the module lock themselves.
+// process detaches; the map's own reference does not keep the DLL loaded, but every reference a
+// client holds beyond it does, or the DLL could be unloaded under a client's factory.
 class ClassFactoryBase : public IClassFactory {
 public:
     virtual ~ClassFactoryBase() = default;
@@ -23,9 +24,14 @@ public:
         AddRef();
         return S_OK;
     }
-    STDMETHODIMP_(ULONG) AddRef() override { return ++references; }
+    STDMETHODIMP_(ULONG) AddRef() override {
+        ULONG count = ++references;
+        if (count > 1) LockModule();
+        return count;
+    }
     STDMETHODIMP_(ULONG) Release() override {
         ULONG left = --references;
+        if (left > 0) UnlockModule();
         if (left == 0) delete this;
         return left;
     }

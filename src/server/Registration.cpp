@@ -3,6 +3,8 @@
 #include <windows.h>
 #include <ole2.h>
 
+#include <cwchar>
+#include <functional>
 #include <string>
 
 #include "com/ComPtr.h"
@@ -22,10 +24,15 @@ std::string GuidText(const GUID& guid) {
     return narrow;
 }
 
-std::string ModulePath() {
-    char path[MAX_PATH + 1] = {};
-    ::WideCharToMultiByte(CP_ACP, 0, GetOwnModulePath(), -1, path, MAX_PATH, nullptr, nullptr);
-    return path;
+// The module path goes in wide, as the loader gave it: a folder name outside the ANSI code page must
+// still name this file.
+LSTATUS SetModulePath(HKEY root, const std::string& subKey) {
+    UniqueRegistryKey key;
+    LSTATUS status = ::RegCreateKeyExA(root, subKey.c_str(), 0, nullptr, 0, KEY_WRITE, nullptr, key.Put(), nullptr);
+    if (status != ERROR_SUCCESS) return status;
+    const wchar_t* path = GetOwnModulePath();
+    auto bytes = static_cast<DWORD>((std::wcslen(path) + 1) * sizeof(wchar_t));
+    return ::RegSetValueExW(key.Get(), nullptr, 0, REG_SZ, reinterpret_cast<const BYTE*>(path), bytes);
 }
 
 // Creates root\subKey (and its parents) and sets one string value; a null value name is the default.
@@ -57,36 +64,33 @@ HRESULT RegisterClass(const ObjectMapEntry& entry) {
     std::string progId = "SessionMgr." + name + ".1";
     std::string independentProgId = "SessionMgr." + name;
     std::string classKey = "CLSID\\" + classIdText;
-    const LSTATUS steps[] = {
-        SetString(HKEY_CLASSES_ROOT, progId, nullptr, description),
-        SetString(HKEY_CLASSES_ROOT, progId + "\\CLSID", nullptr, classIdText),
-        SetString(HKEY_CLASSES_ROOT, independentProgId, nullptr, description),
-        SetString(HKEY_CLASSES_ROOT, independentProgId + "\\CLSID", nullptr, classIdText),
-        SetString(HKEY_CLASSES_ROOT, independentProgId + "\\CurVer", nullptr, progId),
+    // Each step runs only when the one before it succeeded: the first failure is the answer.
+    const std::function<LSTATUS()> steps[] = {
+        [&] { return SetString(HKEY_CLASSES_ROOT, progId, nullptr, description); },
+        [&] { return SetString(HKEY_CLASSES_ROOT, progId + "\\CLSID", nullptr, classIdText); },
+        [&] { return SetString(HKEY_CLASSES_ROOT, independentProgId, nullptr, description); },
+        [&] { return SetString(HKEY_CLASSES_ROOT, independentProgId + "\\CLSID", nullptr, classIdText); },
+        [&] { return SetString(HKEY_CLASSES_ROOT, independentProgId + "\\CurVer", nullptr, progId); },
         // The class key is replaced whole, so nothing of an older registration survives.
-        DeleteTree(HKEY_CLASSES_ROOT, classKey),
-        SetString(HKEY_CLASSES_ROOT, classKey, nullptr, description),
-        SetString(HKEY_CLASSES_ROOT, classKey + "\\ProgID", nullptr, progId),
-        SetString(HKEY_CLASSES_ROOT, classKey + "\\VersionIndependentProgID", nullptr, independentProgId),
-        CreateKey(HKEY_CLASSES_ROOT, classKey + "\\Programmable"),
-        SetString(HKEY_CLASSES_ROOT, classKey + "\\InprocServer32", nullptr, ModulePath()),
-        SetString(HKEY_CLASSES_ROOT, classKey + "\\InprocServer32", "ThreadingModel", "Free"),
-        SetString(HKEY_CLASSES_ROOT, classKey + "\\TypeLib", nullptr, GuidText(LIBID_SM)),
+        [&] { return DeleteTree(HKEY_CLASSES_ROOT, classKey); },
+        [&] { return SetString(HKEY_CLASSES_ROOT, classKey, nullptr, description); },
+        [&] { return SetString(HKEY_CLASSES_ROOT, classKey + "\\ProgID", nullptr, progId); },
+        [&] { return SetString(HKEY_CLASSES_ROOT, classKey + "\\VersionIndependentProgID", nullptr, independentProgId); },
+        [&] { return CreateKey(HKEY_CLASSES_ROOT, classKey + "\\Programmable"); },
+        [&] { return SetModulePath(HKEY_CLASSES_ROOT, classKey + "\\InprocServer32"); },
+        [&] { return SetString(HKEY_CLASSES_ROOT, classKey + "\\InprocServer32", "ThreadingModel", "Free"); },
+        [&] { return SetString(HKEY_CLASSES_ROOT, classKey + "\\TypeLib", nullptr, GuidText(LIBID_SM)); },
     };
-    for (LSTATUS status : steps)
-        if (status != ERROR_SUCCESS) return Check(status);
+    for (const auto& step : steps)
+        if (LSTATUS status = step(); status != ERROR_SUCCESS) return Check(status);
     return S_OK;
 }
 
 HRESULT UnregisterClass(const ObjectMapEntry& entry) {
     std::string name = entry.className;
-    const LSTATUS steps[] = {
-        DeleteTree(HKEY_CLASSES_ROOT, "SessionMgr." + name + ".1"),
-        DeleteTree(HKEY_CLASSES_ROOT, "SessionMgr." + name),
-        DeleteTree(HKEY_CLASSES_ROOT, "CLSID\\" + GuidText(*entry.classId)),
-    };
-    for (LSTATUS status : steps)
-        if (status != ERROR_SUCCESS) return Check(status);
+    const std::string keys[] = {"SessionMgr." + name + ".1", "SessionMgr." + name, "CLSID\\" + GuidText(*entry.classId)};
+    for (const std::string& key : keys)
+        if (LSTATUS status = DeleteTree(HKEY_CLASSES_ROOT, key); status != ERROR_SUCCESS) return Check(status);
     return S_OK;
 }
 

@@ -2,10 +2,9 @@
 
 namespace sm {
 
-CCustomInstrSession::~CCustomInstrSession() {
-    // The close function and release-on-close objects run even when Close was never called or
-    // was disabled.
-    CloseForDestruction();
+void CCustomInstrSession::FinalClose() {
+    SessionCall call(*this);
+    InstrSession::FinalClose();
     initialized = false;
 }
 

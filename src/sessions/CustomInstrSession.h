@@ -10,7 +10,7 @@ class CCustomInstrSession : public InstrSession<CCustomInstrSession> {
 public:
     static const CLSID& ClassId() { return CLSID_CustomInstrSession; }
     static constexpr const char* ClassName() { return "CCustomInstrSession"; }
-    ~CCustomInstrSession() override;
+    void FinalClose();
 
     STDMETHODIMP Initialize(BSTR options) override;
     STDMETHODIMP IsInitialized(VARIANT_BOOL* result) override;

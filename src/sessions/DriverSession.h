@@ -65,7 +65,7 @@ public:
     // The work of the final release: close actions forced on, driver closed, library freed. Safe to
     // run twice; nothing here may raise.
     void FinalClose() {
-        CriticalSectionGuard guard(this->objectLock);
+        typename SessionBase::SessionCall call(*this);
         this->closeEnabled = true;
         UnloadDriver();
     }

@@ -16,7 +16,6 @@ class CIVIInstrSession : public DriverSession<CIVIInstrSession> {
 public:
     static const CLSID& ClassId() { return CLSID_IVIInstrSession; }
     static constexpr const char* ClassName() { return "CIVIInstrSession"; }
-    ~CIVIInstrSession() override { FinalClose(); }
 
     // The manager hands over a copy of the configuration entry right after creation.
     void SetEntry(const IviEntry& configured) { entry = configured; }

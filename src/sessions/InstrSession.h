@@ -178,30 +178,44 @@ protected:
     template <class Body>
     HRESULT Locked(Body&& body) {
         return this->Boundary([&] {
-            CriticalSectionGuard guard(objectLock);
+            SessionCall call(*this);
             return body();
         });
     }
 
-    // The session classes' destructors force the close actions to run (see each class).
-    void CloseForDestruction() {
-        CriticalSectionGuard guard(objectLock);
+public:
+    // The close work of the final release, run while the object is still whole. The close
+    // function and release-on-close objects run even when Close was never called or was
+    // disabled. A session class with more to close (a driver, a library) hides this with its own
+    // FinalClose, safe to run twice.
+    void FinalClose() {
+        SessionCall call(*this);
         closeEnabled = true;
         RunCloseActions(Self());
     }
 
+protected:
     // Final release: a session that belongs to a manager leaves its table under the manager's
-    // lock, so FindExistingSession can never hand out an object that is going away.
+    // lock, so FindExistingSession can never hand out an object that is going away. The close
+    // work then runs with the count pinned far from zero: a close function or a release-on-close
+    // object that takes and drops a reference to the session must not start a second release.
     ULONG InternalRelease() override {
-        SessionOwner* tableOwner = Owner();
-        if (!tableOwner) return Base::InternalRelease();
-        tableOwner->LockTable();
-        if (this->references.load() == 1) tableOwner->RemoveSession(*this);
-        ULONG left = --this->references;
-        tableOwner->UnlockTable();
-        if (left == 0) delete this;
-        return left;
+        ULONG left = 0;
+        if (SessionOwner* tableOwner = Owner()) {
+            tableOwner->LockTable();
+            if (this->references.load() == 1) tableOwner->RemoveSession(*this);
+            left = --this->references;
+            tableOwner->UnlockTable();
+        } else {
+            left = --this->references;
+        }
+        if (left != 0) return left;
+        this->references = pinnedReferences;
+        static_cast<Session*>(this)->FinalClose();
+        delete this;
+        return 0;
     }
+    static constexpr ULONG pinnedReferences = 0x40000000;
 
 private:
     static void Clear(BSTR* output) { *output = nullptr; }

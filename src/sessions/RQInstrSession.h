@@ -11,7 +11,6 @@ namespace sm {
 
 class CRQInstrSession : public DriverSession<CRQInstrSession> {
 public:
-    ~CRQInstrSession() override { FinalClose(); }
 
     static const CLSID& ClassId() { return CLSID_RQInstrSession; }
     static constexpr const char* ClassName() { return "CRQInstrSession"; }

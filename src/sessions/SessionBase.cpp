@@ -135,14 +135,30 @@ void SessionBase::base_GetString(std::string_view id, String& result) {
 }
 
 void SessionBase::DetachData(std::string_view id) {
-    // Taken out of the list before they are destroyed: releasing an object may call back into us.
-    std::vector<std::unique_ptr<DataItem>> removed;
+    // Taken out of the list before they are released: releasing an object may call back into us.
     for (std::size_t index = dataItems.size(); index-- > 0;) {
         if (id.empty() || dataItems[index]->id.View() == id) {
-            removed.push_back(std::move(dataItems[index]));
+            std::unique_ptr<DataItem> removed = std::move(dataItems[index]);
             dataItems.erase(dataItems.begin() + static_cast<std::ptrdiff_t>(index));
+            Drop(std::move(removed->object));
         }
     }
+}
+
+void SessionBase::Drop(ComPtr<IUnknown> object) {
+    if (object && callDepth > 0) droppedObjects.push_back(std::move(object));
+}
+
+SessionBase::SessionCall::SessionCall(SessionBase& session) : session(session) {
+    session.objectLock.Lock();
+    ++session.callDepth;
+}
+
+SessionBase::SessionCall::~SessionCall() {
+    std::vector<ComPtr<IUnknown>> dropped;
+    if (--session.callDepth == 0) dropped.swap(session.droppedObjects);
+    session.objectLock.Unlock();
+    // dropped is released here, with objectLock left.
 }
 
 // ---- session lock ---------------------------------------------------------------------------------
@@ -209,9 +225,7 @@ void SessionBase::RunCloseActions(IInstrSession* self) {
     }
     for (std::size_t index = 0; index < dataItems.size(); ++index) {
         DataItem& item = *dataItems[index];
-        if (item.kind == DataItemKind::Object && item.releaseOnClose && item.object) {
-            ComPtr<IUnknown> dropped = std::move(item.object);
-        }
+        if (item.kind == DataItemKind::Object && item.releaseOnClose && item.object) Drop(std::move(item.object));
     }
 }
 

@@ -73,6 +73,7 @@ public:
     void GetLockState(String& ownerKey, std::int32_t& nestingLevel);
 
     // Calls the close function once (it is cleared first) and drops release-on-close objects.
+    // Objects dropped inside a SessionCall are released when the outermost call leaves objectLock.
     void RunCloseActions(IInstrSession* self);
     void AppendDataItemsDescription(String& text) const;
 
@@ -82,6 +83,21 @@ public:
 
     // Serialises the automation methods; recursive, so a close function may call back in.
     CriticalSection objectLock;
+
+    // Holds objectLock for one automation call. Releasing an object may run its owner's code, which
+    // may reach a final release that takes the manager's lock, while the manager takes a session's
+    // lock after its own: so objects that calls drop are released only when the outermost call has
+    // left objectLock.
+    class SessionCall {
+    public:
+        explicit SessionCall(SessionBase& session);
+        ~SessionCall();
+        SessionCall(const SessionCall&) = delete;
+        SessionCall& operator=(const SessionCall&) = delete;
+
+    private:
+        SessionBase& session;
+    };
 
 protected:
     bool initialized = false;
@@ -97,6 +113,8 @@ protected:
     std::int32_t lockLevel = 0;
 
 private:
+    // Releases at once outside a SessionCall, otherwise when the outermost call leaves objectLock.
+    void Drop(ComPtr<IUnknown> object);
     void AppendItem(std::unique_ptr<DataItem> item, std::string_view id);
     DataItem& FindItemOfKind(std::string_view id, DataItemKind kind, const char* function);
 
@@ -107,6 +125,9 @@ private:
     std::mutex releaseMutex;
     std::condition_variable released;
     std::uint64_t releaseCount = 0;
+    // Guarded by objectLock.
+    std::uint32_t callDepth = 0;
+    std::vector<ComPtr<IUnknown>> droppedObjects;
 };
 
 }  // namespace sm

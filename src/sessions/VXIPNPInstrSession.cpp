@@ -6,7 +6,6 @@
 
 namespace sm {
 
-CVXIPNPInstrSession::~CVXIPNPInstrSession() { FinalClose(); }
 
 STDMETHODIMP CVXIPNPInstrSession::Initialize(BSTR) {
     return Locked([&] { ImplementInit(); });

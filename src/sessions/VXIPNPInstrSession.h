@@ -17,7 +17,6 @@ public:
     using DriverInit = ViStatus(ViConstRsrc resource, ViBoolean idQuery, ViBoolean reset, ViSession* vi);
     using DriverClose = ViStatus(ViSession vi);
 
-    ~CVXIPNPInstrSession() override;
 
     // Set by the manager when it creates the session for a found virtual instrument.
     void SetVirtualInstrument(const VxipnpVInstr& instrument) { vinstr = instrument; }

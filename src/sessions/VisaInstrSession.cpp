@@ -2,10 +2,8 @@
 
 namespace sm {
 
-CVisaInstrSession::~CVisaInstrSession() { FinalClose(); }
-
 void CVisaInstrSession::FinalClose() {
-    CriticalSectionGuard guard(objectLock);
+    SessionCall call(*this);
     closeEnabled = true;
     CloseResource();
 }

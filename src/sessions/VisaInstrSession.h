@@ -13,7 +13,6 @@ class CVisaInstrSession : public InstrSession<CVisaInstrSession> {
 public:
     static const CLSID& ClassId() { return CLSID_VisaInstrSession; }
     static constexpr const char* ClassName() { return "CVisaInstrSession"; }
-    ~CVisaInstrSession() override;
 
     // The name group the manager found for the session's name.
     void SetEntry(const VisaEntry& found) { entry = found; }

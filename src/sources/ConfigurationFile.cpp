@@ -17,6 +17,11 @@ struct ConfigurationState {
     std::int32_t generation = 0;
     Path vxipnpDirectory;
     Path platformDirectory;
+    // The file could not be written into the platform directory while it had this write time; the
+    // configuration then holds the regenerated text. Scanning every driver image again at each
+    // request would gain nothing until the directory changes.
+    bool writeFailed = false;
+    std::uint64_t failedDirectoryTime = 0;
 };
 
 // Lives until the process ends: sessions and sources may use it during static destruction.
@@ -86,7 +91,8 @@ Path GetConfigurationFilePath() {
     return path;
 }
 
-void RegenerateConfigurationFile(const Path& path) {
+namespace {
+std::string GenerateConfigurationText() {
     std::vector<Driver> drivers = ScanForDrivers();
     IniObj sections;
     for (const Driver& driver : drivers) {
@@ -99,6 +105,38 @@ void RegenerateConfigurationFile(const Path& path) {
     }
     std::string text = configurationFileHeader;
     text += drivers.empty() ? std::string("\n;; NO VXIPNP drivers found!\n") : sections.WriteString(true);
+    return text;
+}
+
+// Regenerates the missing file. When the platform directory exists but the file cannot be written
+// there (a read-only directory is the normal case for a standard user), the regenerated text is
+// served from memory, and the failure is remembered until the directory's write time changes.
+// Gives whether the file was written.
+bool RegenerateMissingFile(ConfigurationState& state, const Path& path) {
+    Path platform;
+    std::uint64_t directoryTime = 0;
+    bool directoryExists = GetPlatformDirectory(platform) && configuration::GetLastWriteTime(platform.View(), directoryTime);
+    if (directoryExists && state.writeFailed && directoryTime == state.failedDirectoryTime) return false;
+    std::string text = GenerateConfigurationText();
+    if (configuration::WriteTextFile(path.View(), text)) {
+        state.writeFailed = false;
+        return true;
+    }
+    if (directoryExists) {
+        IniObj fresh;
+        fresh.ReadString(text);
+        state.configuration = std::move(fresh);
+        state.fileTime = 0;
+        ++state.generation;
+        state.writeFailed = true;
+        state.failedDirectoryTime = directoryTime;
+    }
+    return false;
+}
+}  // namespace
+
+void RegenerateConfigurationFile(const Path& path) {
+    std::string text = GenerateConfigurationText();
     if (path.IsEmpty() || !configuration::WriteTextFile(path.View(), text)) {
         DynamicString message("Could not write the session manager configuration file '%1'.");
         message.ReplaceArg(1, path.View());
@@ -113,13 +151,14 @@ const IniObj& GetConfiguration(std::int32_t& generation) {
     if (!path.IsEmpty()) {
         bool existed = configuration::FileExists(path.View());
         bool regenerated = false;
-        if (!existed) {
+        if (existed) {
+            state.writeFailed = false;
+        } else {
             try {
-                RegenerateConfigurationFile(path);
-                regenerated = true;
+                regenerated = RegenerateMissingFile(state, path);
             } catch (const TEException&) {
-                // An unwritable directory leaves the configuration as it was; the next request
-                // tries again.
+                // A document that cannot be made leaves the configuration as it was; the next
+                // request tries again.
             }
         }
         std::uint64_t written = 0;

@@ -22,7 +22,9 @@ bool GetPlatformDirectory(Path& directory);
 Path GetConfigurationFilePath();
 
 // The file's contents, regenerated first when the file is missing and read again when its
-// last-write time moved forward. Call with ConfigurationLock held. generation grows at every read.
+// last-write time moved forward. When the platform directory exists but the file cannot be written
+// into it, the regenerated contents are served from memory until the directory's write time
+// changes or the file appears. Call with ConfigurationLock held. generation grows at every read.
 const IniObj& GetConfiguration(std::int32_t& generation);
 
 // Writes a new configuration file at path from the drivers found in the platform directory.

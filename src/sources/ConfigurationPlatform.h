@@ -9,7 +9,8 @@
 
 namespace sm::configuration {
 
-// Value "VXIPNPPATH" of HKLM "SOFTWARE\VXIPNP_Alliance\VXIPNP\CurrentVersion", any type, as text.
+// Value "VXIPNPPATH" of HKLM "SOFTWARE\VXIPNP_Alliance\VXIPNP\CurrentVersion", any type, as text;
+// counts only when not empty.
 bool ReadRegistryDirectory(std::string& value);
 // Environment variable "VXIPNPPATH"; counts only when not empty.
 bool ReadEnvironmentDirectory(std::string& value);

@@ -20,6 +20,9 @@ bool ReadRegistryDirectory(std::string& value) {
         ERROR_SUCCESS)
         return false;
     data.resize(std::min<std::size_t>(size, std::char_traits<char>::length(data.c_str())));
+    // An empty value names no directory (it would make the platform directory a relative "Win64"):
+    // the environment gets its turn.
+    if (data.empty()) return false;
     value = data;
     return true;
 }

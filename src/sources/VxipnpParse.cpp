@@ -1,6 +1,7 @@
 // Turning the configuration document into virtual instruments and logical names: plain rules over
 // an IniObj, tested natively.
 #include "framework/MultiByte.h"
+#include "framework/TEException.h"
 #include "sources/VxipnpInfo.h"
 
 namespace sm {
@@ -11,10 +12,18 @@ constexpr std::string_view vinstrPrefix = "VPPVInstr->";
 void ReadLogicalNames(const IniObj& configuration, std::string_view section, LogicalNameList& list) {
     const SectionEntry* found = configuration.FindSection(section);
     if (!found) return;
-    for (const ItemEntry& item : found->items) {
-        DynamicString value;
-        configuration.Get(section, item.name, value);
-        list.emplace_back(DynamicString(std::string_view(item.name)), value);
+    // Each item's own value: a name given twice must not take the first one's value twice.
+    for (const ItemEntry& item : found->items)
+        list.emplace_back(DynamicString(std::string_view(item.name)), DynamicString(UnescapeIniText(item.value)));
+}
+
+// A module path too long for a path leaves out its instrument only, not the whole source.
+bool ReadModulePath(const IniObj& configuration, std::string_view section, Path& path) {
+    try {
+        return configuration.Get(section, "ModulePath", path);
+    } catch (const TEException& error) {
+        if (error.GetApiErrorCode() != InvalidPath) throw;
+        return false;
     }
 }
 
@@ -41,7 +50,7 @@ void VxipnpInfo::Parse(const IniObj& configuration) {
         if (!multibyte::BeginsWith(section.name, vinstrPrefix, true)) continue;
         VxipnpVInstr instrument;
         instrument.name.Assign(std::string_view(section.name).substr(vinstrPrefix.size()));
-        if (!configuration.Get(section.name, "ModulePath", instrument.modulePath)) continue;
+        if (!ReadModulePath(configuration, section.name, instrument.modulePath)) continue;
         if (!configuration.Get(section.name, "Prefix", instrument.prefix)) continue;
         if (!configuration.Get(section.name, "Resource", instrument.resource)) continue;
         if (!ReadDefault(configuration, section.name, "QVSessionManager_IDQuery", "IDQuery", instrument.idQuery)) continue;

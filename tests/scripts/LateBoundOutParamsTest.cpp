@@ -5,6 +5,7 @@
 // this folder cannot read these results; here the references have the declared types.
 #include <gtest/gtest.h>
 
+#include <cstdio>
 #include <string>
 #include <vector>
 
@@ -111,11 +112,13 @@ TEST(LateBoundOutParams, UniqueKeyNamesCountTicksAndProcess) {
         ASSERT_EQ(CallByName(manager.Get(), L"GetUniqueKeyName", {ByRef(key.Put())}), S_OK);
         DWORD after = ::GetTickCount();
         keys[call] = Text(key.Get());
-        // "Lock", the manager's counter, the tick count and the process ID, run together.
+        // "Lock", the manager's counter, the tick count and the process ID, ten digits each.
         bool matches = false;
-        for (DWORD tick = before; tick <= after && !matches; ++tick)
-            matches = keys[call] == "Lock" + std::to_string(call + 1) + std::to_string(tick) +
-                                        std::to_string(::GetCurrentProcessId());
+        for (DWORD tick = before; tick <= after && !matches; ++tick) {
+            char expected[40];
+            std::snprintf(expected, sizeof expected, "Lock%010d%010lu%010lu", call + 1, tick, ::GetCurrentProcessId());
+            matches = keys[call] == expected;
+        }
         EXPECT_TRUE(matches) << keys[call];
     }
     EXPECT_NE(keys[0], keys[1]);
