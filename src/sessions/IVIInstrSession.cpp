@@ -202,7 +202,7 @@ void CIVIInstrSession::AppendDriverErrorDetails(String& message, ViStatus status
 
 // ---- handles --------------------------------------------------------------------------------------
 
-CIVIInstrSession::ViSession CIVIInstrSession::GetHandle_Internal(InterfaceLevel level, bool checkProcess) {
+ViSession CIVIInstrSession::GetHandle_Internal(InterfaceLevel level, bool checkProcess) {
     if (checkProcess && inExternalProcess)
         TE_RAISE(TE_OPERATION_FAILED, handleFunction,
                  "IVI instrument handles cannot be used outside of the operating system process that they are "
