@@ -17,7 +17,6 @@ cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient V
 
 sm_start_wine
 trap sm_stop_wine EXIT
-sm_install_sim
 
 out="$SM_WINDOWS_BUILD/demo"
 mkdir -p "$out"
@@ -39,6 +38,9 @@ sm_register_external_server
 sm_install_sim
 # Through the environment rather than the registry, so the prefix the tests share stays untouched.
 export VXIPNPPATH="$SM_SIM_VXIPNP_DIR_WINDOWS"
+# Every stand-in reads the one demo bench (docs/simulated-setup.md).
+timeout 60 wine winepath -w "$root/sim/simsetup.ini" >"$out/simsetup.winpath" 2>/dev/null || true
+export SM_SIM_SETUP="$(tr -d '\r\n' <"$out/simsetup.winpath")"
 
 status=0
 
@@ -143,5 +145,17 @@ timeout 120 wine "$external_client" second >"$out/ExternalDemoClient.second.txt"
 wait "$first_pid" || status=1
 tr -d '\r' <"$out/ExternalDemoClient.first.txt"
 tr -d '\r' <"$out/ExternalDemoClient.second.txt"
+
+echo
+echo "== The station tool: sessionmgr.exe list, then sessionmgr.exe state =="
+tool="$SM_WINDOWS_BUILD/apps/StationTool/sessionmgr.exe"
+for command in list state; do
+  if ! timeout 120 wine "$tool" "$command" >"$out/sessionmgr-$command.txt" 2>&1; then
+    echo "sessionmgr $command failed"
+    status=1
+  fi
+  echo "-- sessionmgr $command"
+  tr -d '\r' <"$out/sessionmgr-$command.txt"
+done
 
 exit "$status"
