@@ -14,7 +14,6 @@
 #include "framework/PeExports.h"
 #include "framework/TEException.h"
 #include "sources/ConfigurationFile.h"
-#include "sources/ConfigurationFileHeader.h"
 #include "sources/VxipnpInfo.h"
 
 using namespace sm;
@@ -80,7 +79,8 @@ TEST_F(ConfigurationFile, MissingPlatformDirectoryLeavesTheConfigurationEmptyAnd
 
     ASSERT_TRUE(::CreateDirectoryA(platform.c_str(), nullptr));
     EXPECT_EQ(CurrentGeneration(), 1);
-    EXPECT_EQ(ReadFileBytes(file), WithCrLf(std::string(configurationFileHeader) + "\n;; NO VXIPNP drivers found!\n"));
+    // The header users read is compared with the shipped text, kept as data beside this test.
+    EXPECT_EQ(ReadFileBytes(file), WithCrLf(ReadFileBytes(SESSIONMGR_CONFIGURATION_HEADER) + "\n;; NO VXIPNP drivers found!\n"));
 }
 
 TEST_F(ConfigurationFile, RegenerationWritesOneSectionPerDetectedDriver) {
@@ -102,7 +102,7 @@ TEST_F(ConfigurationFile, RegenerationWritesOneSectionPerDetectedDriver) {
     EXPECT_TRUE(source.VirtualInstruments().empty());
 
     std::string written = ReadFileBytes(file);
-    std::string header = WithCrLf(configurationFileHeader);
+    std::string header = WithCrLf(ReadFileBytes(SESSIONMGR_CONFIGURATION_HEADER));
     ASSERT_EQ(written.substr(0, header.size()), header);
     IniObj reread;
     reread.ReadFile(file);
