@@ -1,23 +1,36 @@
-// A test fixture that runs its body under the double-byte code page 932 (Shift-JIS) and restores
-// the previous code page afterwards: character rules must hold for lead and trail bytes too.
+// The process code page for the length of a scope, restored however the scope ends (a failed
+// ASSERT included), and a fixture that runs its body under the double-byte code page 932
+// (Shift-JIS): character rules must hold for lead and trail bytes too.
 #pragma once
 
 #include <gtest/gtest.h>
+
+#include <string>
 
 #include "framework/CodePage.h"
 
 namespace sm::testing {
 
-class DoubleByteCodePage : public ::testing::Test {
-protected:
-    void SetUp() override {
-        previous = GetMultiByteCodePage();
-        ASSERT_TRUE(SetMultiByteCodePage(932));
+class CodePageScope {
+public:
+    explicit CodePageScope(int codePage) : previous(GetMultiByteCodePage()) {
+        EXPECT_TRUE(SetMultiByteCodePage(codePage));
     }
-    void TearDown() override { SetMultiByteCodePage(previous); }
+    ~CodePageScope() { SetMultiByteCodePage(previous); }
+    CodePageScope(const CodePageScope&) = delete;
+    CodePageScope& operator=(const CodePageScope&) = delete;
 
 private:
-    int previous = 0;
+    int previous;
 };
+
+class DoubleByteCodePage : public ::testing::Test {
+    CodePageScope scope{932};
+};
+
+// Shift-JIS characters: a full-width "a" (lead 0x82, trail 0x81) and one whose trail byte is the
+// backslash byte 0x5C.
+inline const std::string wideA = "\x82\x81";
+inline const std::string wideWithBackslashTrail = "\x95\x5C";
 
 }  // namespace sm::testing

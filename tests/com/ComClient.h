@@ -2,6 +2,8 @@
 #pragma once
 
 #include "ComTestSupport.h"
+
+#include <vector>
 #include "com/Interfaces.h"
 
 namespace sm::testing {
@@ -45,6 +47,62 @@ IUnknown* IdentityOf(Interface* object) {
     ComPtr<IUnknown> unknown;
     object->QueryInterface(IID_IUnknown, unknown.PutVoid());
     return unknown.Get();  // the object stays alive through the caller's own reference
+}
+
+// Arguments of a late-bound call in declaration order, freed when done; a reference argument points
+// at the caller's variable, which keeps what the call puts there.
+class Arguments {
+public:
+    Arguments() = default;
+    Arguments(const Arguments&) = delete;
+    Arguments& operator=(const Arguments&) = delete;
+    ~Arguments() {
+        for (VARIANT& value : values) ::VariantClear(&value);
+    }
+    Arguments& Text(const wchar_t* text) { return Add(VT_BSTR).bstrVal = ::SysAllocString(text), *this; }
+    Arguments& Long(LONG number) { return Add(VT_I4).lVal = number, *this; }
+    Arguments& Double(double number) { return Add(VT_R8).dblVal = number, *this; }
+    Arguments& Bool(bool flag) { return Add(VT_BOOL).boolVal = flag ? VARIANT_TRUE : VARIANT_FALSE, *this; }
+    Arguments& TextOut(BSTR* text) { return Add(VT_BYREF | VT_BSTR).pbstrVal = text, *this; }
+    Arguments& LongOut(LONG* number) { return Add(VT_BYREF | VT_I4).plVal = number, *this; }
+    // IDispatch takes the arguments last first.
+    std::vector<VARIANT> Reversed() const { return {values.rbegin(), values.rend()}; }
+
+private:
+    VARIANT& Add(VARTYPE type) {
+        values.emplace_back();
+        ::VariantInit(&values.back());
+        values.back().vt = type;
+        return values.back();
+    }
+    std::vector<VARIANT> values;
+};
+
+struct LateResult {
+    HRESULT result = E_FAIL;
+    unsigned long code = 0;  // EXCEPINFO scode when the call raised
+    std::string description;
+    UniqueVariant value;
+};
+
+// A call by member name, the way a script host makes it.
+inline LateResult Invoke(IDispatch* target, const wchar_t* name, WORD flags, const Arguments& arguments = {}) {
+    LateResult outcome;
+    DISPID member = DISPID_UNKNOWN;
+    auto* names = const_cast<LPOLESTR>(name);
+    outcome.result = target->GetIDsOfNames(IID_NULL, &names, 1, LOCALE_USER_DEFAULT, &member);
+    if (FAILED(outcome.result)) return outcome;
+    std::vector<VARIANT> reversed = arguments.Reversed();
+    DISPPARAMS parameters{reversed.data(), nullptr, static_cast<UINT>(reversed.size()), 0};
+    UniqueExcepInfo exception;
+    outcome.result = target->Invoke(member, IID_NULL, LOCALE_USER_DEFAULT, flags, &parameters, outcome.value.Get(),
+                                    &exception, nullptr);
+    if (outcome.result == DISP_E_EXCEPTION) {
+        if (exception.pfnDeferredFillIn) exception.pfnDeferredFillIn(&exception);
+        outcome.code = static_cast<unsigned long>(exception.scode);
+        outcome.description = Text(exception.bstrDescription);
+    }
+    return outcome;
 }
 
 }  // namespace sm::testing

@@ -5,6 +5,7 @@
 #include <objbase.h>
 
 #include <string>
+#include <vector>
 
 #include "com/BstrConversion.h"
 #include "com/ComPtr.h"
@@ -36,6 +37,56 @@ inline ReportedError TakeErrorInfo() {
     info->GetDescription(description.Put());
     reported.description = BstrToMultiByte(description.Get());
     return reported;
+}
+
+// A failure as a client sees it: the HRESULT, then the error info's description and class.
+inline void ExpectComError(HRESULT result, unsigned long code, const std::string& description, REFGUID source) {
+    EXPECT_EQ(static_cast<unsigned long>(result), code);
+    ReportedError reported = TakeErrorInfo();
+    EXPECT_TRUE(reported.present);
+    EXPECT_EQ(reported.description, description);
+    EXPECT_TRUE(IsEqualGUID(reported.guid, source));
+}
+
+// TE codes as HRESULTs.
+constexpr unsigned long outOfRange = 0xFFFFBC6C;         // -17300
+constexpr unsigned long unrecognizedValue = 0xFFFFBC68;  // -17304
+constexpr unsigned long duplicateItem = 0xFFFFBC67;      // -17305
+constexpr unsigned long typeMismatch = 0xFFFFBC57;       // -17321
+constexpr unsigned long invalidPointer = 0xFFFFBC3E;     // -17346
+constexpr unsigned long timedOut = 0xFFFFBC06;           // -17402
+constexpr unsigned long operationFailed = 0xFFFFBBA4;    // -17500
+
+// The elements of a one-dimensional array from 0 of this element type; nothing else is a valid
+// listing. An array that crossed an apartment under Wine no longer reports its element type (its
+// elements are intact): pass VT_EMPTY to skip that check.
+template <class Element>
+std::vector<Element> ReadSafeArray(SAFEARRAY* array, VARTYPE elementType) {
+    std::vector<Element> elements;
+    EXPECT_NE(array, nullptr) << "an empty listing must still be an array";
+    if (!array) return elements;
+    EXPECT_EQ(::SafeArrayGetDim(array), 1u);
+    VARTYPE type = VT_EMPTY;
+    if (elementType != VT_EMPTY) {
+        EXPECT_EQ(::SafeArrayGetVartype(array, &type), S_OK);
+        EXPECT_EQ(type, elementType);
+    }
+    LONG lower = -1, upper = -2;
+    ::SafeArrayGetLBound(array, 1, &lower);
+    ::SafeArrayGetUBound(array, 1, &upper);
+    EXPECT_EQ(lower, 0);
+    for (LONG index = lower; index <= upper; ++index) {
+        Element element{};
+        EXPECT_EQ(::SafeArrayGetElement(array, &index, element.Put()), S_OK);
+        elements.push_back(std::move(element));
+    }
+    return elements;
+}
+
+inline std::vector<std::string> ReadTexts(SAFEARRAY* array) {
+    std::vector<std::string> texts;
+    for (const UniqueBstr& text : ReadSafeArray<UniqueBstr>(array, VT_BSTR)) texts.push_back(BstrToMultiByte(text.Get()));
+    return texts;
 }
 
 }  // namespace sm::testing

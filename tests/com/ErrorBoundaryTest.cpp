@@ -21,11 +21,7 @@ const CLSID testClass = {0x7D4A10B1, 0x2C88, 0x4E21, {0xB3, 0xF6, 0x91, 0xE5, 0x
 TEST(ErrorBoundary, TECodeBecomesTheHResultWithMessageAndClass) {
     ::SetErrorInfo(0, nullptr);
     HRESULT result = ComBoundary(testClass, [] { TE_RAISE(TE_OPERATION_TIMED_OUT, "SessionBase::base_LockSession"); });
-    EXPECT_EQ(static_cast<unsigned long>(result), 0xFFFFBC06ul);
-    auto reported = TakeErrorInfo();
-    ASSERT_TRUE(reported.present);
-    EXPECT_EQ(reported.description, "Operation Timed Out.");
-    EXPECT_TRUE(IsEqualGUID(reported.guid, testClass));
+    sm::testing::ExpectComError(result, sm::testing::timedOut, "Operation Timed Out.", testClass);
 }
 
 TEST(ErrorBoundary, FormattedMessagesArriveWhole) {
@@ -43,19 +39,12 @@ TEST(ErrorBoundary, ComErrorPassesWithItsOwnInfo) {
         SetComErrorInfo(GUID_NULL, -1, "from inside");
         ThrowComError(E_NOINTERFACE);
     });
-    EXPECT_EQ(result, E_NOINTERFACE);
-    auto reported = TakeErrorInfo();
-    ASSERT_TRUE(reported.present);
-    EXPECT_EQ(reported.description, "from inside");
-    EXPECT_TRUE(IsEqualGUID(reported.guid, GUID_NULL));
+    sm::testing::ExpectComError(result, E_NOINTERFACE, "from inside", GUID_NULL);
 }
 
 TEST(ErrorBoundary, AnythingElseIsOperationFailed) {
     HRESULT result = ComBoundary(testClass, [] { throw std::runtime_error("not ours"); });
-    EXPECT_EQ(static_cast<unsigned long>(result), 0xFFFFBBA4ul);
-    auto reported = TakeErrorInfo();
-    EXPECT_EQ(reported.description, "Operation Failed.");
-    EXPECT_TRUE(IsEqualGUID(reported.guid, testClass));
+    sm::testing::ExpectComError(result, sm::testing::operationFailed, "Operation Failed.", testClass);
 }
 
 TEST(ErrorBoundary, SuccessAndExplicitResultsPassThrough) {

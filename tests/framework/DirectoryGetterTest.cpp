@@ -2,6 +2,8 @@
 // layouts, registry overrides and their views, and the caches.
 #include <gtest/gtest.h>
 
+#include "CatchTE.h"
+
 #include <map>
 #include <set>
 #include <string>
@@ -11,6 +13,7 @@
 #include "framework/TEException.h"
 
 using namespace sm;
+using sm::testing::ExpectTE;
 
 namespace {
 
@@ -29,6 +32,7 @@ public:
     }
     std::string ShellFolder(int csidl) override {
         ++shellRequests;
+        if (failShellFolders) TE_RAISE(TE_PATH_NOT_FOUND, "TableSystem::ShellFolder");
         if (csidl == 46) return "C:\\Users\\Public\\Documents";
         if (csidl == 35) return "C:\\ProgramData";
         if (csidl == 28) return "C:\\Users\\me\\AppData\\Local";
@@ -43,6 +47,7 @@ public:
     std::map<std::tuple<std::string, std::string, bool>, std::string> machine;
     std::set<std::string> files;
     int shellRequests = 0;
+    bool failShellFolders = false;
 
     static constexpr const char* engineKey = "CLSID\\{E17A3C92-4B08-4F6D-95E1-A2C7083D5B64}\\InprocServer32";
 };
@@ -66,16 +71,8 @@ TEST(InstalledLayout, ShellFoldersPlusProductFolders) {
 TEST(InstalledLayout, NoEngineAndNoFrameworkModuleMeansNoInstallation) {
     TableSystem system;
     DirectoryGetter getter("2021", system);
-    TEException raised;
-    try {
-        getter.GetInstallationDirectory();
-        ADD_FAILURE() << "nothing was raised";
-    } catch (const TEException& caught) {
-        raised = caught;
-    }
-    EXPECT_EQ(raised.GetErrorCode(), TE_OPERATION_FAILED);
-    EXPECT_STREQ(raised.GetDescription(), "Verentis Engine not registered");
-    EXPECT_STREQ(raised.GetFunction(), "DirectoryGetter::GetActiveTEDirectoryFromRegistry");
+    ExpectTE([&] { getter.GetInstallationDirectory(); }, TE_OPERATION_FAILED, "Verentis Engine not registered",
+             "DirectoryGetter::GetActiveTEDirectoryFromRegistry");
 }
 
 TEST(InstalledLayout, InstallationIsThreeComponentsAboveTheEngineModule) {
@@ -168,19 +165,8 @@ TEST(Caching, OneGetterPerExactVersionText) {
 }
 
 TEST(Failures, AShellFolderThatCannotBeFoundFailsTheRequest) {
-    class NoShell final : public DirectorySystem {
-    public:
-        std::optional<std::string> LoadedFrameworkModulePath() override { return std::nullopt; }
-        std::optional<std::string> ClassesRootDefaultValue(std::string_view) override { return std::nullopt; }
-        std::optional<std::string> MachineValue(std::string_view, std::string_view, bool) override { return std::nullopt; }
-        std::string ShellFolder(int) override { TE_RAISE(TE_PATH_NOT_FOUND, "NoShell::ShellFolder"); }
-        bool FileExists(std::string_view) override { return false; }
-    } system;
+    TableSystem system;
+    system.failShellFolders = true;
     DirectoryGetter getter("2021", system);
-    try {
-        getter.GetConfigDirectory("E", true);
-        ADD_FAILURE() << "nothing was raised";
-    } catch (const TEException& caught) {
-        EXPECT_EQ(caught.GetErrorCode(), TE_PATH_NOT_FOUND);
-    }
+    EXPECT_EQ(sm::testing::CatchTE([&] { getter.GetConfigDirectory("E", true); }).GetErrorCode(), TE_PATH_NOT_FOUND);
 }

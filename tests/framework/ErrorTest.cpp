@@ -11,10 +11,7 @@
 #include "framework/TEException.h"
 
 using namespace sm;
-using sm::testing::CatchTE;
-
-namespace {
-}  // namespace
+using namespace sm::testing;
 
 TEST(DefaultMessages, ComeFromTheCodesRow) {
     EXPECT_EQ(GetTEErrorMessage(TE_OPERATION_TIMED_OUT), "Operation Timed Out.");
@@ -35,15 +32,11 @@ TEST(DefaultMessages, EveryTableRowHasItsOwnMessage) {
     }
 }
 
-TEST(LanguageTable, LookupsIgnoreCaseOfSectionAndKey) {
+TEST(LanguageTable, LookupsIgnoreCaseAndMissingKeysGiveTheDefaultOrTheNotFoundText) {
     EXPECT_EQ(GetLanguageString("te_errors", "te_operation_failed"), "Operation Failed.");
     EXPECT_EQ(GetLanguageString("Err_Descr", "cant_find_file"), "Could not find file '%1'.");
-    EXPECT_EQ(GetLanguageString("lgw_toolerr", "LINETOOLONG"),
-              "A line in the file was longer than the supported maximum of %1 bytes.");
-}
-
-TEST(LanguageTable, MissingKeysGiveTheDefaultOrTheNotFoundText) {
     EXPECT_EQ(GetLanguageString("TE_ERRORS", "NO_SUCH_KEY", "my default"), "my default");
+
     EXPECT_EQ(GetLanguageString("TE_ERRORS", "NO_SUCH_KEY"), "String not found in the language resource files");
     EXPECT_EQ(GetLanguageString("NO_SECTION", "TE_OPERATION_FAILED"), "String not found in the language resource files");
 }
@@ -55,8 +48,6 @@ TEST(Raising, FillsTheRecordFromTheSite) {
     EXPECT_STREQ(caught.GetFunction(), "SessionBase::base_LockSession");
     EXPECT_STREQ(caught.GetFile(), "ErrorTest.cpp");
     EXPECT_GT(caught.GetLine(), 0);
-    EXPECT_STREQ(caught.GetCompileDate(), __DATE__);
-    EXPECT_EQ(std::string(caught.GetCompileTime()).size(), 8u);
     EXPECT_STREQ(caught.GetSource(), "");
     EXPECT_STREQ(caught.GetApiFunction(), "");
     EXPECT_EQ(caught.GetApiErrorCode(), 0);
@@ -131,15 +122,10 @@ TEST(Diagnostics, MissingArgumentWarningOnlyAboveLevelZero) {
 }
 
 TEST(SystemErrors, MapToFileCodes) {
-    EXPECT_EQ(SystemErrorToTECode(0), TE_IO_ERROR);
-    EXPECT_EQ(SystemErrorToTECode(1), TE_IO_ERROR);
-    EXPECT_EQ(SystemErrorToTECode(1157), TE_DLL_NOT_LOADABLE);
-    EXPECT_EQ(SystemErrorToTECode(2), TE_FILE_NOT_FOUND);
-    EXPECT_EQ(SystemErrorToTECode(65), TE_ACCESS_DENIED);
-    EXPECT_EQ(SystemErrorToTECode(183), TE_FILE_ALREADY_EXISTS);
-    EXPECT_EQ(SystemErrorToTECode(240), TE_BAD_NET_PATH);
-    EXPECT_EQ(SystemErrorToTECode(0x80004003u), TE_INVALID_POINTER);
-    EXPECT_EQ(SystemErrorToTECode(0x80020005u), TE_TYPE_MISMATCH_ERROR);
-    EXPECT_EQ(SystemErrorToTECode(0x8007000Eu), TE_OUT_OF_MEMORY);
-    EXPECT_EQ(SystemErrorToTECode(0x80070002u), TE_IO_ERROR);
+    const std::pair<unsigned long, int> table[] = {
+        {0, TE_IO_ERROR}, {1, TE_IO_ERROR}, {1157, TE_DLL_NOT_LOADABLE}, {2, TE_FILE_NOT_FOUND},
+        {65, TE_ACCESS_DENIED}, {183, TE_FILE_ALREADY_EXISTS}, {240, TE_BAD_NET_PATH},
+        {0x80004003u, TE_INVALID_POINTER}, {0x80020005u, TE_TYPE_MISMATCH_ERROR}, {0x8007000Eu, TE_OUT_OF_MEMORY},
+        {0x80070002u, TE_IO_ERROR}};
+    for (auto [system, code] : table) EXPECT_EQ(SystemErrorToTECode(system), code) << system;
 }

@@ -2,6 +2,8 @@
 // reference caught instead of read.
 #include <gtest/gtest.h>
 
+#include "CatchTE.h"
+
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -78,14 +80,8 @@ std::vector<std::string> Read(const std::vector<unsigned char>& image) {
 
 void ExpectBadFormat(const std::vector<unsigned char>& image) {
     StringVector names;
-    try {
-        ReadExportNames(image, names);
-        ADD_FAILURE() << "no error raised";
-    } catch (const TEException& error) {
-        EXPECT_EQ(error.GetErrorCode(), TE_BAD_FILE_FORMAT);
-        EXPECT_STREQ(error.GetFunction(), "ReadDLLExports");
-        EXPECT_STREQ(error.GetDescription(), "Incorrect file format.");
-    }
+    sm::testing::ExpectTE([&] { ReadExportNames(image, names); }, TE_BAD_FILE_FORMAT, "Incorrect file format.",
+                          "ReadDLLExports");
 }
 }  // namespace
 

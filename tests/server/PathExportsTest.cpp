@@ -7,15 +7,15 @@
 #include <shlobj.h>
 
 #include <atomic>
-#include <filesystem>
-#include <fstream>
 #include <string>
 
 #include "com/BstrConversion.h"
 #include "com/LibraryBinding.h"
 #include "com/UniqueHandles.h"
+#include "TempFolder.h"
 
 using namespace sm;
+using sm::testing::TempFolder;
 
 namespace {
 
@@ -103,40 +103,6 @@ private:
     REGSAM view;
 };
 
-// A scratch folder under the user's temp folder, removed with everything in it.
-class ScratchFolder {
-public:
-    ScratchFolder() {
-        char temp[MAX_PATH] = {};
-        ::GetTempPathA(MAX_PATH, temp);
-        path = std::string(temp) + "PathExportsTest-" + std::to_string(::GetCurrentProcessId()) + "-" +
-               std::to_string(::GetTickCount()) + "\\";
-        ::CreateDirectoryA(path.c_str(), nullptr);
-    }
-    ~ScratchFolder() {
-        std::error_code ignored;
-        std::filesystem::remove_all(path, ignored);
-    }
-    std::string MakeFolders(const std::string& relative) const {
-        std::string full = path;
-        std::size_t start = 0;
-        while (start < relative.size()) {
-            std::size_t end = relative.find('\\', start);
-            if (end == std::string::npos) end = relative.size();
-            full += relative.substr(start, end - start) + "\\";
-            ::CreateDirectoryA(full.c_str(), nullptr);
-            start = end + 1;
-        }
-        return full;
-    }
-    std::string Write(const std::string& relative, const std::string& bytes) const {
-        std::string full = path + relative;
-        std::ofstream(full, std::ios::binary) << bytes;
-        return full;
-    }
-    std::string path;
-};
-
 class EngineRegistration {
 public:
     explicit EngineRegistration(const std::string& modulePath) {
@@ -204,23 +170,12 @@ TEST_F(InstalledLayout, PublicAndApplicationDataDirectories) {
               "D:\\Shared Public");
 }
 
-TEST_F(InstalledLayout, NullArgumentsGiveNullResults) {
-    auto function = Exports().Get<KeyedDirectory>("GetConfigDirectory");
-    ASSERT_NE(function, nullptr);
-    function("x", "y", 1, nullptr);  // nowhere to put the answer: nothing happens
-    EXPECT_FALSE(Exports().Get<bool(const char*, int)>("IsValidPath")(nullptr, 0));
-    EXPECT_FALSE(Exports().Get<bool(const char*, const char*)>("FilesAreIdentical")(nullptr, "x"));
-}
-
 TEST(DevelopmentLayout, TheBeaconBesideTheRegisteredEngineMakesADevelopmentBuild) {
     ASSERT_NE(Exports().Module(), nullptr);
-    ScratchFolder scratch;
-    std::string installation = scratch.MakeFolders("Tree\\Verentis");
-    scratch.MakeFolders("Tree\\Verentis\\Bin\\x64");
+    TempFolder scratch("PathExportsTest");
+    std::string tree = scratch.path + "\\Tree\\";
     scratch.Write("Tree\\Verentis\\" + beacon, "");
-    EngineRegistration engine(installation + "Bin\\x64\\Engine.dll");
-    std::string tree = scratch.path + "Tree\\";
-
+    EngineRegistration engine(scratch.Folder("Tree\\Verentis\\Bin\\x64") + "\\Engine.dll");
     // IsDevBuild answers for the product's own version; no other test asks for it.
     EXPECT_TRUE(Exports().Get<bool()>("IsDevBuild")());
     std::string version = UniqueVersion("Development");
@@ -238,47 +193,31 @@ TEST(DevelopmentLayout, TheBeaconBesideTheRegisteredEngineMakesADevelopmentBuild
 TEST(DevelopmentLayout, ALoadedFrameworkModuleLocatesTheInstallation) {
     ASSERT_NE(Exports().Module(), nullptr);
     EngineRegistration::Remove();
-    ScratchFolder scratch;
-    std::string release = scratch.MakeFolders("Work\\Verentis\\Bin\\x64\\Release");
+    TempFolder scratch("PathExportsTest");
+    std::string release = scratch.Folder("Work\\Verentis\\Bin\\x64\\Release") + "\\vantrel.dll";
     scratch.Write("Work\\Verentis\\" + beacon, "");
-    ASSERT_TRUE(::CopyFileA((ExeFolder() + "exports\\vantrel.dll").c_str(), (release + "vantrel.dll").c_str(), FALSE));
-    std::string version = UniqueVersion("Framework");
-    {
-        UniqueModule framework(::LoadLibraryA((release + "vantrel.dll").c_str()));
-        ASSERT_TRUE(framework);
-        EXPECT_EQ(Directory("GetVerentisCommonAppDataDirectory", version.c_str()),
-                  scratch.path + "Work\\CommonAppData\\");
-    }
+    ASSERT_TRUE(::CopyFileA((ExeFolder() + "exports\\vantrel.dll").c_str(), release.c_str(), FALSE));
+    UniqueModule framework(::LoadLibraryA(release.c_str()));
+    ASSERT_TRUE(framework);
+    EXPECT_EQ(Directory("GetVerentisCommonAppDataDirectory", UniqueVersion("Framework").c_str()),
+              scratch.path + "\\Work\\CommonAppData\\");
 }
 
-TEST(PathChecks, IsValidPathOnTheFrameworksForms) {
+// The path rules themselves are the framework's; here only their way through the exports.
+TEST(PathChecks, ReachTheFrameworkAndNeverRaiseAcrossTheExport) {
     auto isValidPath = Exports().Get<bool(const char*, int)>("IsValidPath");
-    ASSERT_NE(isValidPath, nullptr);
-    EXPECT_FALSE(isValidPath(("C:\\" + std::string(297, 'p')).c_str(), 0));
-    EXPECT_TRUE(isValidPath("C:", 0));
-    EXPECT_TRUE(isValidPath("C:dir", 0));
-    EXPECT_FALSE(isValidPath("\\\\server", 0));
+    auto filesAreIdentical = Exports().Get<bool(const char*, const char*)>("FilesAreIdentical");
+    ASSERT_TRUE(isValidPath && filesAreIdentical);
     EXPECT_TRUE(isValidPath("\\\\server\\share\\file.txt", 0));
     EXPECT_FALSE(isValidPath("C:\\dir\\*.txt", 0));
     EXPECT_TRUE(isValidPath("C:\\dir\\*.txt", 1));
-    EXPECT_FALSE(isValidPath("C:\\d*r\\file.txt", 0));
-    EXPECT_FALSE(isValidPath("C:\\d*r\\file.txt", 1));
-    EXPECT_FALSE(isValidPath("C:\\a\\\\b", 0));
-}
-
-TEST(PathChecks, FilesAreIdenticalOnCopiesAndLastByteDifferences) {
-    auto filesAreIdentical = Exports().Get<bool(const char*, const char*)>("FilesAreIdentical");
-    ASSERT_NE(filesAreIdentical, nullptr);
-    ScratchFolder scratch;
-    std::string content(9000, 'c');
-    for (std::size_t i = 0; i < content.size(); ++i) content[i] = static_cast<char>('a' + i % 23);
-    std::string original = scratch.Write("original.bin", content);
-    std::string copy = scratch.path + "copy.bin";
-    ASSERT_TRUE(::CopyFileA(original.c_str(), copy.c_str(), FALSE));
-    EXPECT_TRUE(filesAreIdentical(original.c_str(), copy.c_str()));
-    std::string changed = content;
-    changed.back() = 'Z';
-    EXPECT_FALSE(filesAreIdentical(original.c_str(), scratch.Write("last.bin", changed).c_str()));
+    EXPECT_FALSE(isValidPath(nullptr, 0));
+    TempFolder scratch("PathExportsTest");
+    std::string original = scratch.Write("original.bin", std::string(9000, 'c'));
+    EXPECT_TRUE(filesAreIdentical(original.c_str(), scratch.Write("copy.bin", std::string(9000, 'c')).c_str()));
+    EXPECT_FALSE(filesAreIdentical(original.c_str(), scratch.Write("last.bin", std::string(8999, 'c') + "Z").c_str()));
     // A missing file cannot be compared: false, and no exception crosses the export.
-    EXPECT_FALSE(filesAreIdentical(original.c_str(), (scratch.path + "missing.bin").c_str()));
+    EXPECT_FALSE(filesAreIdentical(original.c_str(), (scratch.path + "\\missing.bin").c_str()));
+    EXPECT_FALSE(filesAreIdentical(nullptr, "x"));
+    Exports().Get<KeyedDirectory>("GetConfigDirectory")("x", "y", 1, nullptr);  // nowhere to put it: no crash
 }

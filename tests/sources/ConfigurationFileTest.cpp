@@ -4,17 +4,20 @@
 #include <gtest/gtest.h>
 #include <windows.h>
 
+#include <filesystem>
 #include <fstream>
-#include <iterator>
 #include <string>
+
+#include "CatchTE.h"
+#include "TempFolder.h"
 
 #include "framework/PeExports.h"
 #include "framework/TEException.h"
 #include "sources/ConfigurationFile.h"
-#include "sources/ConfigurationFileHeader.h"
 #include "sources/VxipnpInfo.h"
 
 using namespace sm;
+using namespace sm::testing;
 
 namespace {
 const std::string root = [] {
@@ -27,35 +30,9 @@ const std::string root = [] {
 const std::string platform = root + "\\Win64";
 const std::string file = platform + "\\QVSessionMgr.ini";
 
-void RemoveTree(const std::string& path) {
-    WIN32_FIND_DATAA data;
-    HANDLE find = ::FindFirstFileA((path + "\\*").c_str(), &data);
-    if (find != INVALID_HANDLE_VALUE) {
-        do {
-            std::string name = data.cFileName;
-            if (name == "." || name == "..") continue;
-            std::string child = path + "\\" + name;
-            if (data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY)
-                RemoveTree(child);
-            else
-                ::DeleteFileA(child.c_str());
-        } while (::FindNextFileA(find, &data));
-        ::FindClose(find);
-    }
-    ::RemoveDirectoryA(path.c_str());
-}
-
 void Copy(const char* from, const std::string& to) { ASSERT_TRUE(::CopyFileA(from, to.c_str(), FALSE)) << to; }
 
-std::string ReadBytes(const std::string& path) {
-    std::ifstream in(path, std::ios::binary);
-    return {std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>()};
-}
-
-void WriteBytes(const std::string& path, const std::string& text) {
-    std::ofstream out(path, std::ios::binary | std::ios::trunc);
-    out << text;
-}
+void WriteBytes(const std::string& path, const std::string& text) { std::ofstream(path, std::ios::binary) << text; }
 
 std::string WithCrLf(std::string text) {
     std::string converted;
@@ -91,7 +68,8 @@ class ConfigurationFile : public ::testing::Test {};
 }  // namespace
 
 TEST_F(ConfigurationFile, MissingPlatformDirectoryLeavesTheConfigurationEmptyAndIsRetried) {
-    RemoveTree(root);
+    std::error_code ignored;
+    std::filesystem::remove_all(root, ignored);
     ASSERT_TRUE(::CreateDirectoryA(root.c_str(), nullptr));
     EXPECT_EQ(CurrentGeneration(), 0);
     EXPECT_FALSE(::GetFileAttributesA(file.c_str()) != INVALID_FILE_ATTRIBUTES);
@@ -101,7 +79,8 @@ TEST_F(ConfigurationFile, MissingPlatformDirectoryLeavesTheConfigurationEmptyAnd
 
     ASSERT_TRUE(::CreateDirectoryA(platform.c_str(), nullptr));
     EXPECT_EQ(CurrentGeneration(), 1);
-    EXPECT_EQ(ReadBytes(file), WithCrLf(std::string(configurationFileHeader) + "\n;; NO VXIPNP drivers found!\n"));
+    // The header users read is compared with the shipped text, kept as data beside this test.
+    EXPECT_EQ(ReadFileBytes(file), WithCrLf(ReadFileBytes(SESSIONMGR_CONFIGURATION_HEADER) + "\n;; NO VXIPNP drivers found!\n"));
 }
 
 TEST_F(ConfigurationFile, RegenerationWritesOneSectionPerDetectedDriver) {
@@ -122,8 +101,8 @@ TEST_F(ConfigurationFile, RegenerationWritesOneSectionPerDetectedDriver) {
     // Fresh sections have an empty resource, so no virtual instrument counts yet.
     EXPECT_TRUE(source.VirtualInstruments().empty());
 
-    std::string written = ReadBytes(file);
-    std::string header = WithCrLf(configurationFileHeader);
+    std::string written = ReadFileBytes(file);
+    std::string header = WithCrLf(ReadFileBytes(SESSIONMGR_CONFIGURATION_HEADER));
     ASSERT_EQ(written.substr(0, header.size()), header);
     IniObj reread;
     reread.ReadFile(file);
@@ -133,21 +112,20 @@ TEST_F(ConfigurationFile, RegenerationWritesOneSectionPerDetectedDriver) {
     // twice keeps its first place and the items of the one put later.
     EXPECT_EQ(sections, (std::vector<std::string>{"VISA Logical Names", "VXIPNP Logical Names", "VPPVInstr->dup",
                                                   "VPPVInstr->odd", "VPPVInstr->abc"}));
-    DynamicString value;
-    ASSERT_TRUE(reread.Get("VPPVInstr->dup", "ModulePath", value));
-    EXPECT_EQ(std::string(value.View()), platform + "\\sub1\\dup1.dll");
-    ASSERT_TRUE(reread.Get("VPPVInstr->odd", "Prefix", value));
-    EXPECT_EQ(std::string(value.View()), "odd");
-    ASSERT_TRUE(reread.Get("VPPVInstr->abc", "Resource", value));
-    EXPECT_EQ(std::string(value.View()), "");
-    ASSERT_NE(reread.FindItem("VPPVInstr->abc", "IDQuery"), nullptr);
-    EXPECT_EQ(reread.FindItem("VPPVInstr->abc", "IDQuery")->value, "True");
-    EXPECT_FALSE(reread.FindItem("VPPVInstr->abc", "IDQuery")->quoted);
-    EXPECT_TRUE(reread.FindItem("VPPVInstr->abc", "ModulePath")->quoted);
+    auto item = [&](const char* section, const char* name) {
+        const ItemEntry* found = reread.FindItem(section, name);
+        DynamicString value;
+        reread.Get(section, name, value);  // decoded
+        return found ? std::string(value.View()) + (found->quoted ? " (quoted)" : "") : "<missing>";
+    };
+    EXPECT_EQ(item("VPPVInstr->dup", "ModulePath"), platform + "\\sub1\\dup1.dll (quoted)");
+    EXPECT_EQ(item("VPPVInstr->odd", "Prefix"), "odd (quoted)");
+    EXPECT_EQ(item("VPPVInstr->abc", "Resource"), " (quoted)");
+    EXPECT_EQ(item("VPPVInstr->abc", "IDQuery"), "True");
 }
 
 TEST_F(ConfigurationFile, NewerWriteTimeIsReadAgainAndOlderIsNot) {
-    std::string text = ReadBytes(file);
+    std::string text = ReadFileBytes(file);
     std::size_t resource = text.find("Resource = \"\"", text.find("[VPPVInstr->abc]"));
     ASSERT_NE(resource, std::string::npos);
     text.replace(resource, 13, "Resource = \"GPIB0::14::INSTR\"");
@@ -210,11 +188,7 @@ TEST(DriverImages, ExportNamesOfRealImages) {
     EXPECT_EQ(plain, (std::vector<std::string>{"ExportOnlyDriverEntry", "odd_ErrorMessage", "odd_ErrorQuery",
                                                "odd_RevisionQuery", "odd_SelfTest", "odd_close", "odd_init",
                                                "odd_reset"}));
-    try {
-        ReadDLLExports(root + "\\no such file.dll", names);
-        ADD_FAILURE() << "a missing file raised nothing";
-    } catch (const TEException& error) {
-        EXPECT_EQ(error.GetErrorCode(), TE_FILE_NOT_FOUND);
-        EXPECT_EQ(error.GetApiErrorCode(), 2);
-    }
+    TEException error = CatchTE([&] { ReadDLLExports(root + "\\no such file.dll", names); });
+    EXPECT_EQ(error.GetErrorCode(), TE_FILE_NOT_FOUND);
+    EXPECT_EQ(error.GetApiErrorCode(), 2);
 }

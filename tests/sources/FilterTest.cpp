@@ -5,10 +5,11 @@
 #include <string>
 #include <vector>
 
-#include "framework/CodePage.h"
+#include "DoubleByteCodePage.h"
 #include "sources/InfoBase.h"
 
 using namespace sm;
+using sm::testing::DoubleByteCodePage;
 
 namespace {
 using Texts = std::vector<std::string>;
@@ -52,20 +53,11 @@ TEST(SplitFilterList, BlanksAroundPiecesAreRemoved) {
     EXPECT_EQ(Split("a,  "), (Texts{"a", ""}));
 }
 
-TEST(ExcludedBySpecificPrefix, NoFiltersKeepEverything) {
-    FilterOnlySource source;
-    EXPECT_FALSE(source.ExcludedBySpecificPrefix({}, "hp34401a"));
-    EXPECT_FALSE(Excluded("", "hp34401a"));
-}
-
 TEST(ExcludedBySpecificPrefix, PrefixFiltersKeepTheirPrefixesOnly) {
+    EXPECT_FALSE(Excluded("", "hp34401a")) << "no filters keep everything";
     const char* filter = "SpecificPrefix=hp34401a, SpecificPrefix = ag34401a";
-    EXPECT_FALSE(Excluded(filter, "hp34401a"));
-    EXPECT_FALSE(Excluded(filter, "ag34401a"));
-    EXPECT_FALSE(Excluded(filter, "AG34401A"));
-    EXPECT_TRUE(Excluded(filter, "ke34401a"));
-    EXPECT_TRUE(Excluded(filter, "hp34401"));
-    EXPECT_TRUE(Excluded(filter, ""));
+    for (const char* kept : {"hp34401a", "ag34401a", "AG34401A"}) EXPECT_FALSE(Excluded(filter, kept)) << kept;
+    for (const char* excluded : {"ke34401a", "hp34401", ""}) EXPECT_TRUE(Excluded(filter, excluded)) << excluded;
 }
 
 TEST(ExcludedBySpecificPrefix, FiltersOfAnotherFormExcludeEveryPrefix) {
@@ -97,13 +89,10 @@ TEST(ExcludedBySpecificPrefix, KeywordFormsThatDoNotCount) {
     EXPECT_TRUE(Excluded("SpecificPrefix=", "hp34401a"));
 }
 
-TEST(ExcludedBySpecificPrefix, DoubleByteTextBeforeTheKeyword) {
-    int previous = GetMultiByteCodePage();
-    ASSERT_TRUE(SetMultiByteCodePage(932));
+TEST_F(DoubleByteCodePage, ExcludedBySpecificPrefixCountsCharactersBeforeTheKeyword) {
     // Positions of the keyword are counted in characters; the value starts right after the "=".
     const std::string wide = "\x82\x81\x82\x82";
     EXPECT_FALSE(Excluded(wide + "SpecificPrefix=hp34401a", "hp34401a"));
     EXPECT_FALSE(Excluded(wide + " SpecificPrefix = " + wide, wide));
     EXPECT_TRUE(Excluded(wide + "SpecificPrefix=hp34401a", "p34401a"));
-    SetMultiByteCodePage(previous);
 }

@@ -25,9 +25,8 @@ Separator SeparatorOf(const std::string& text) {
 }
 
 using sm::testing::DoubleByteCodePage;
-
-// Shift-JIS characters: a full-width letter, and one whose trail byte is a backslash (0x5C).
-const std::string wideA = "\x82\x81";
+using sm::testing::wideA;
+// A Shift-JIS character whose trail byte is a backslash (0x5C).
 const std::string trailBackslash = "\x83\x5C";
 }  // namespace
 
@@ -63,18 +62,13 @@ TEST(CategorySeparator, LengthIsDecidedAtTheFirstSeparatorCharacter) {
     EXPECT_EQ(slashFirst.length, 1u);
 }
 
-TEST(CategorySeparator, AtTheEdgesOfTheText) {
-    Separator leading = SeparatorOf("::DMM1");
-    EXPECT_EQ(leading.position, 0u);
-    EXPECT_EQ(leading.length, 2u);
-    Separator trailing = SeparatorOf("CUSTOM:");
-    EXPECT_EQ(trailing.position, 6u);
-    EXPECT_EQ(trailing.length, 1u);
+TEST(CategorySeparator, AtTheEdgesAbsentInPlainNamesAndEmptyText) {
+    EXPECT_EQ(SeparatorOf("::DMM1").position, 0u);
+    EXPECT_EQ(SeparatorOf("::DMM1").length, 2u);
+    EXPECT_EQ(SeparatorOf("CUSTOM:").position, 6u);
+    EXPECT_EQ(SeparatorOf("CUSTOM:").length, 1u);
     EXPECT_EQ(SeparatorOf("CUSTOM::").length, 2u);
     EXPECT_EQ(SeparatorOf("CUSTOM:/\\").length, 3u);
-}
-
-TEST(CategorySeparator, AbsentInPlainNamesAndEmptyText) {
     std::size_t position = 7, length = 7;
     EXPECT_FALSE(FindCategorySeparator("", &position, &length));
     EXPECT_FALSE(FindCategorySeparator("DMM1", &position, &length));
@@ -83,26 +77,15 @@ TEST(CategorySeparator, AbsentInPlainNamesAndEmptyText) {
     EXPECT_TRUE(FindCategorySeparator("IVI/DMM1", nullptr, nullptr));
 }
 
-TEST_F(DoubleByteCodePage, SeparatorPositionCountsCharacters) {
-    Separator found = SeparatorOf(wideA + wideA + "::x");
-    EXPECT_EQ(found.position, 2u);
-    EXPECT_EQ(found.length, 2u);
-    Separator mixed = SeparatorOf("a" + wideA + "b/" + wideA);
-    EXPECT_EQ(mixed.position, 3u);
-    EXPECT_EQ(mixed.length, 1u);
-}
-
-TEST_F(DoubleByteCodePage, TrailByteBackslashIsNoSeparator) {
+TEST_F(DoubleByteCodePage, SeparatorPositionCountsCharactersAndATrailByteBackslashIsNoSeparator) {
+    EXPECT_EQ(SeparatorOf(wideA + wideA + "::x").position, 2u);
+    EXPECT_EQ(SeparatorOf("a" + wideA + "b/" + wideA).position, 3u);
     // A byte scan would stop inside the double-byte character at its 0x5C trail byte.
     std::size_t position = 7, length = 7;
     EXPECT_FALSE(FindCategorySeparator(trailBackslash + "DMM", &position, &length));
-    Separator found = SeparatorOf(trailBackslash + trailBackslash + "::DMM");
-    EXPECT_EQ(found.position, 2u);
-    EXPECT_EQ(found.length, 2u);
+    EXPECT_EQ(SeparatorOf(trailBackslash + trailBackslash + "::DMM").position, 2u);
     // A double-byte character right after a colon does not lengthen the separator.
-    Separator colon = SeparatorOf("IVI:" + trailBackslash);
-    EXPECT_EQ(colon.position, 3u);
-    EXPECT_EQ(colon.length, 1u);
+    EXPECT_EQ(SeparatorOf("IVI:" + trailBackslash).length, 1u);
 }
 
 TEST(ExternalPrefix, RecognisedForms) {

@@ -2,6 +2,8 @@
 // they get, which logical names belong to them, and which names a listing returns.
 #include <gtest/gtest.h>
 
+#include "CatchTE.h"
+
 #include <string>
 #include <vector>
 
@@ -92,11 +94,7 @@ TEST(VirtualInstruments, ANonBooleanDefaultIsAReadError) {
     document.ReadString(std::string_view(
         "[VPPVInstr->Bad]\nModulePath = \"m\"\nPrefix = \"a\"\nResource = \"r\"\nIDQuery = maybe\nReset = True\n"));
     VxipnpInfo source;
-    try {
-        source.Parse(document);
-        ADD_FAILURE() << "no error raised";
-    } catch (const TEException& error) {
-        EXPECT_EQ(error.GetErrorCode(), TE_INVALID_OR_OUT_OF_RANGE);
-        EXPECT_EQ(error.GetApiErrorCode(), InvalidBooleanValue);
-    }
+    TEException error = sm::testing::CatchTE([&] { source.Parse(document); });
+    EXPECT_EQ(error.GetErrorCode(), TE_INVALID_OR_OUT_OF_RANGE);
+    EXPECT_EQ(error.GetApiErrorCode(), InvalidBooleanValue);
 }
