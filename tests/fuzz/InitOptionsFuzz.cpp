@@ -6,6 +6,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <string>
+#include <vector>
 
 #include "FuzzCheck.h"
 #include "framework/CodePage.h"
@@ -20,10 +21,20 @@ namespace {
 
 constexpr const char* target = "InitOptionsFuzz";
 
+// Blanks are trimmed by character: the byte after a lead byte belongs to that character, blank or not.
 std::string_view Trimmed(std::string_view text) {
-    while (!text.empty() && IsSingleByteSpace(static_cast<unsigned char>(text.front()))) text.remove_prefix(1);
-    while (!text.empty() && IsSingleByteSpace(static_cast<unsigned char>(text.back()))) text.remove_suffix(1);
-    return text;
+    std::vector<std::size_t> starts;
+    for (std::size_t offset = 0; offset < text.size(); offset += multibyte::CharBytes(text, offset)) starts.push_back(offset);
+    auto blank = [&](std::size_t index) {
+        std::size_t start = starts[index];
+        return multibyte::CharBytes(text, start) == 1 && IsSingleByteSpace(static_cast<unsigned char>(text[start]));
+    };
+    std::size_t first = 0, last = starts.size();
+    while (first < last && blank(first)) ++first;
+    while (last > first && blank(last - 1)) --last;
+    if (first == last) return {};
+    std::size_t end = last == starts.size() ? text.size() : starts[last];
+    return text.substr(starts[first], end - starts[first]);
 }
 
 void CheckBoolean(std::string_view value) {
@@ -63,10 +74,12 @@ bool CheckOneExtraction(String& options, std::string_view name) {
     while (!rest.empty() && IsSingleByteSpace(static_cast<unsigned char>(rest.front()))) rest.remove_prefix(1);
     if (rest.empty() || rest.front() != '=') Fail(target, "no '=' after the name", before);
     rest.remove_prefix(1);
-    bool throughComma = !rest.empty() && rest.back() == ',';
-    if (throughComma) rest.remove_suffix(1);
-    else if (start + removedBytes != before.size()) Fail(target, "run stops before the end without a comma", before);
-    if (rest.find(',') != std::string_view::npos) Fail(target, "value runs past a comma", before);
+    // The run ends with the first comma (a character of its own) after "=", or with the text.
+    std::size_t comma = multibyte::FindBytes(rest, ",", 0);
+    bool toEnd = start + removedBytes == before.size();
+    if (comma != std::string_view::npos && comma + 1 != rest.size()) Fail(target, "value runs past a comma", before);
+    if (comma == std::string_view::npos && !toEnd) Fail(target, "run stops before the end without a comma", before);
+    if (comma != std::string_view::npos) rest.remove_suffix(1);
     if (value.View() != Trimmed(rest)) Fail(target, "value is not the trimmed text after '='", before);
     CheckBoolean(value.View());
     return true;

@@ -5,9 +5,11 @@
 // process. At the end every lock must be free, every session but the pinned ones gone, and the table
 // empty once those are released.
 //
-//     SessionStress [seconds=10] [threads=8] [stall-seconds=120]
+//     SessionStress [seconds=10] [threads=8] [stall-seconds=120] [demo-deadlock]
 //
-// Exit 0: no failed call, no deadlock, every invariant held.
+// Exit 0: no failed call, no deadlock, every invariant held; 3 after a deadlock report.
+// "demo-deadlock" shows the watchdog at work: the main thread keeps the first name's session lock
+// and worker 0 waits for it without a timeout.
 #include <objbase.h>
 #include <windows.h>
 
@@ -61,6 +63,7 @@ struct Worker {
 };
 
 std::atomic<bool> stopping{false};
+bool demoDeadlock = false;
 std::atomic<std::uint64_t> failures{0};
 std::mutex reportMutex;
 
@@ -104,6 +107,12 @@ public:
     void Run() {
         manager = CreateManager();
         if (!manager) return;
+        if (demoDeadlock && self.index == 0) {
+            ComPtr<IInstrSession> session;
+            self.current.store(LockUnlock);
+            if (Check(manager->GetInstrSession(Bstr(names[0]).Get(), VARIANT_FALSE, session.Put()), "GetInstrSession"))
+                session->LockSession(Bstr(L"Worker").Get(), -1, 0);
+        }
         while (!stopping.load()) {
             auto operation = static_cast<Operation>(Pick(OperationCount));
             self.current.store(operation);
@@ -111,6 +120,7 @@ public:
             ++self.calls[operation];
             self.progress.fetch_add(1);
         }
+        UnlockAll();
         self.current.store(-1);
         held.clear();
         manager.Reset();
@@ -180,7 +190,15 @@ private:
     }
 
     // Shared keys (two spellings of one) contend; a unique key from the manager never matches another.
+    // A taken lock is kept over later operations and let go by a later call, so other workers meet
+    // it held and wait or time out.
     void LockAndUnlock() {
+        if (!locks.empty() && (locks.size() >= 3 || Pick(2) == 0)) {
+            std::size_t index = Pick(locks.size());
+            Check(locks[index].session->UnlockSession(), "UnlockSession");
+            locks.erase(locks.begin() + static_cast<std::ptrdiff_t>(index));
+            return;
+        }
         IInstrSession* session = AnySession();
         if (!session) return;
         static const double timeouts[] = {0.0, 0.001, 0.01, 0.05};
@@ -207,7 +225,12 @@ private:
         if (Check(session->GetLockState(owner.Put(), &level), "GetLockState") &&
             (level < 1 || ::CompareStringW(LOCALE_INVARIANT, NORM_IGNORECASE, owner.Get(), -1, key.c_str(), -1) != CSTR_EQUAL))
             Fail("GetLockState while held", S_OK, "level " + std::to_string(level));
-        Check(session->UnlockSession(), "UnlockSession");
+        locks.push_back({ComPtr<IInstrSession>(session), false});
+    }
+
+    void UnlockAll() {
+        for (Held& lock : locks) Check(lock.session->UnlockSession(), "UnlockSession (end)");
+        locks.clear();
     }
 
     void Listings() {
@@ -223,6 +246,7 @@ private:
     std::vector<const wchar_t*> names;
     ComPtr<IInstrSessionMgr> manager;
     std::vector<Held> held;
+    std::vector<Held> locks;  // sessions this worker has locked once each, still held
     std::uint64_t itemCounter = 0;
 };
 
@@ -316,6 +340,7 @@ int main(int argc, char** argv) {
     double seconds = argc > 1 ? std::atof(argv[1]) : 10;
     unsigned threads = argc > 2 ? static_cast<unsigned>(std::atoi(argv[2])) : 8;
     double stallSeconds = argc > 3 ? std::atof(argv[3]) : 120;
+    demoDeadlock = argc > 4 && std::strcmp(argv[4], "demo-deadlock") == 0;
     if (FAILED(::CoInitializeEx(nullptr, COINIT_MULTITHREADED))) return 2;
     int exitCode = 0;
     {
@@ -328,6 +353,7 @@ int main(int argc, char** argv) {
             if (Check(manager->GetInstrSession(Bstr(name).Get(), VARIANT_FALSE, session.Put()), "GetInstrSession (pin)"))
                 pinned.push_back(session);
         }
+        if (demoDeadlock && !pinned.empty()) pinned[0]->LockSession(Bstr(L"Main").Get(), 0, 0);
 
         std::vector<Worker> workers(threads);
         ULONGLONG started = ::GetTickCount64();
