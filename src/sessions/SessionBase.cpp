@@ -5,9 +5,8 @@
 #include <limits>
 
 #include "com/BstrConversion.h"
-#include "framework/CodePage.h"
+#include "framework/InitOptions.h"
 #include "framework/LanguageStrings.h"
-#include "framework/MultiByte.h"
 #include "framework/TEException.h"
 #include "sessions/LifeTimeAlerts.h"
 
@@ -188,7 +187,9 @@ void SessionBase::base_LockSession(std::string_view key, double timeoutSeconds) 
             seen = releaseCount;
         }
         if (TryLockSession(key)) return;
-        double remaining = std::clamp(deadline - SecondsNow(), 0.0, 0.2);
+        // Written so that a NaN timeout (a NaN deadline) waits no time instead of converting NaN.
+        double remaining = deadline - SecondsNow();
+        remaining = remaining > 0.2 ? 0.2 : remaining > 0.0 ? remaining : 0.0;
         auto wait = std::chrono::milliseconds(static_cast<long long>(remaining * 1000.0));
         std::unique_lock waiting(releaseMutex);
         released.wait_for(waiting, wait, [&] { return releaseCount != seen; });
@@ -265,36 +266,10 @@ void SessionBase::AppendDataItemsDescription(String& text) const {
 // ---- helpers for category classes -----------------------------------------------------------------
 
 bool SessionBase::ExtractInitOption(String& options, std::string_view optionName, String& value) {
-    std::size_t nameStart = 0;
-    if (!options.Find(optionName, 0, true, &nameStart)) return false;
-    std::string_view text = options.View();
-    std::size_t offset = multibyte::ByteOffset(text, nameStart) + optionName.size();
-    if (offset >= text.size()) return false;
-    while (offset < text.size() && multibyte::CharBytes(text, offset) == 1 &&
-           IsSingleByteSpace(static_cast<unsigned char>(text[offset])))
-        ++offset;
-    if (offset >= text.size() || text[offset] != '=') return false;
-    std::size_t valueStart = offset + 1;
-    std::size_t comma = multibyte::FindBytes(text, ",", valueStart);
-    std::size_t valueEnd = comma == std::string_view::npos ? text.size() : comma;
-    DynamicString found(text.substr(valueStart, valueEnd - valueStart));
-    found.Trim();
-    std::size_t removeEnd = comma == std::string_view::npos ? text.size() : comma + 1;
-    std::size_t removeStart = multibyte::ByteOffset(text, nameStart);
-    std::size_t removeChars = multibyte::CharCount(text.substr(removeStart, removeEnd - removeStart));
-    value.Assign(found);
-    options.Delete(nameStart, static_cast<std::int64_t>(removeChars));
-    return true;
+    return sm::ExtractInitOption(options, optionName, value);
 }
 
-bool SessionBase::GetBooleanInitOptionValue(std::string_view value) {
-    auto is = [&](std::string_view word) { return multibyte::Compare(value, word, true) == 0; };
-    if (is("vi_true") || is("1")) return true;
-    if (is("false") || is("vi_false") || is("0")) return false;
-    DynamicString message("The value '%1' is not a valid value.");
-    message.ReplaceArg(1, value);
-    TE_RAISE(TE_INVALID_OR_OUT_OF_RANGE, "SessionBase::GetBooleanInitOptionValue", message);
-}
+bool SessionBase::GetBooleanInitOptionValue(std::string_view value) { return sm::GetBooleanInitOptionValue(value); }
 
 std::uint64_t SessionBase::Variant2Pointer(const VARIANT& value) {
     if (value.vt == VT_I8) return static_cast<std::uint64_t>(value.llVal);

@@ -77,6 +77,7 @@ public:
     void RunCloseActions(IInstrSession* self);
     void AppendDataItemsDescription(String& text) const;
 
+    // The init-option rules themselves live in framework/InitOptions.h.
     static bool ExtractInitOption(String& options, std::string_view optionName, String& value);
     static bool GetBooleanInitOptionValue(std::string_view value);
     static std::uint64_t Variant2Pointer(const VARIANT& value);
