@@ -8,6 +8,7 @@
 #include <string>
 #include <vector>
 
+#include "BenchReport.h"
 #include "sources/ConfigurationFile.h"
 
 using namespace sm;
@@ -67,5 +68,10 @@ int main() {
     std::printf("regenerate configuration file: %.3f s\n", regenerate);
     std::printf("read every byte of the drivers: %.3f s\n", read);
     std::printf("ratio regenerate/read: %.2f\n", regenerate / read);
+    char figure[32], reference[32];
+    std::snprintf(figure, sizeof figure, "%.3f s", regenerate);
+    std::snprintf(reference, sizeof reference, "%.3f s", read);
+    bench::Row("P5", "regenerating the configuration file, 2,000 images in 100 folders", figure,
+               "reading every byte of the same files", reference, regenerate / read, "<= 1.0");
     return 0;
 }

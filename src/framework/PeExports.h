@@ -2,6 +2,8 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
+#include <functional>
 #include <span>
 #include <string_view>
 
@@ -14,8 +16,14 @@ namespace sm {
 // reference outside the bytes raises TE_BAD_FILE_FORMAT from "ReadDLLExports".
 void ReadExportNames(std::span<const unsigned char> image, StringVector& names);
 
-// Maps the file read-only and reads its export names; the mapping is always released. A file that
-// cannot be opened raises the mapped file error.
+// The same over an image of imageSize bytes that are fetched on demand: fetch(offset, into) fills
+// into with the bytes at offset (never past the end), so only the headers, the export directory
+// and the names are ever read.
+using ImageFetch = std::function<void(std::uint64_t offset, std::span<unsigned char> into)>;
+void ReadExportNames(std::uint64_t imageSize, const ImageFetch& fetch, StringVector& names);
+
+// Reads the export names from the file's headers and export table only. A file that cannot be
+// opened or read raises the mapped file error.
 void ReadDLLExports(std::string_view path, StringVector& names);
 
 }  // namespace sm

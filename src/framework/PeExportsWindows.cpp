@@ -1,5 +1,6 @@
-// Reading an image file for ReadDLLExports on Windows: a read-only mapping, never a load, so a
-// driver's own start-up code never runs while the directory is scanned.
+// Reading an image file for ReadDLLExports on Windows: plain reads of the pages that hold the
+// headers, the export directory and the names, never a load (a driver's own start-up code never
+// runs while the directory is scanned) and never the rest of the file.
 #include <windows.h>
 
 #include <string>
@@ -10,12 +11,6 @@
 namespace sm {
 
 namespace {
-struct MappedView {
-    const void* view = nullptr;
-    ~MappedView() {
-        if (view) ::UnmapViewOfFile(view);
-    }
-};
 struct OwnedHandle {
     HANDLE handle = nullptr;
     ~OwnedHandle() {
@@ -36,16 +31,15 @@ void ReadDLLExports(std::string_view path, StringVector& names) {
     if (file.handle == INVALID_HANDLE_VALUE) RaiseFileError(::GetLastError());
     LARGE_INTEGER size{};
     if (!::GetFileSizeEx(file.handle, &size)) RaiseFileError(::GetLastError());
-    // An empty file cannot be mapped; it is simply not an image.
-    if (size.QuadPart == 0) {
-        ReadExportNames({}, names);
-        return;
-    }
-    OwnedHandle mapping{::CreateFileMappingA(file.handle, nullptr, PAGE_READONLY, 0, 0, nullptr)};
-    if (!mapping.handle) RaiseFileError(::GetLastError());
-    MappedView view{::MapViewOfFile(mapping.handle, FILE_MAP_READ, 0, 0, 0)};
-    if (!view.view) RaiseFileError(::GetLastError());
-    ReadExportNames({static_cast<const unsigned char*>(view.view), static_cast<std::size_t>(size.QuadPart)}, names);
+    ReadExportNames(static_cast<std::uint64_t>(size.QuadPart), [&](std::uint64_t offset, std::span<unsigned char> into) {
+        OVERLAPPED at{};
+        at.Offset = static_cast<DWORD>(offset);
+        at.OffsetHigh = static_cast<DWORD>(offset >> 32);
+        DWORD read = 0;
+        if (!::ReadFile(file.handle, into.data(), static_cast<DWORD>(into.size()), &read, &at)) RaiseFileError(::GetLastError());
+        // The file shrank while it was read: what is missing is outside the image.
+        if (read != into.size()) TE_RAISE(TE_BAD_FILE_FORMAT, "ReadDLLExports", RaiseDetails{.source = "readdll"});
+    }, names);
 }
 
 }  // namespace sm

@@ -40,9 +40,20 @@ public:
 
     virtual void GetName(String& result) const { result.Assign(name); }
     virtual void GetCategory(String& result) const { result.Assign(category); }
-    virtual void SetName(const String& value) { name.Assign(value); }
-    virtual void SetCategory(const String& value) { category.Assign(value); }
+    virtual void SetName(const String& value) {
+        name.Assign(value);
+        if (owner) owner->SessionNamesChanged(*this);
+    }
+    virtual void SetCategory(const String& value) {
+        category.Assign(value);
+        if (owner) owner->SessionNamesChanged(*this);
+    }
     virtual bool HasName(std::string_view candidate) const;
+    // Every name HasName accepts, for the manager's lookup index. A class that overrides HasName
+    // overrides AppendNames in the same class, or its sessions are found by scanning instead.
+    virtual void AppendNames(StringVector& names) const { names.push_back(name); }
+    // False when AppendNames may miss names HasName accepts (see InstrSession::ListNames).
+    virtual bool ListNames(StringVector&) const { return false; }
     virtual bool AcceptsSubcategory(std::string_view subCategory) const;
 
     // Set by the manager right after creation; the session keeps a counted reference on it.
