@@ -166,16 +166,10 @@ void SessionBase::base_LockSession(std::string_view key, double timeoutSeconds) 
     if (key.empty()) TE_RAISE(TE_INVALID_OR_OUT_OF_RANGE, "SessionBase::base_LockSession");
     double deadline = timeoutSeconds < 0 ? std::numeric_limits<double>::max() : start + timeoutSeconds;
     do {
-        std::uint64_t seen;
-        {
-            std::lock_guard guard(releaseMutex);
-            seen = releaseCount;
-        }
+        std::uint64_t seen = released.Count();
         if (TryLockSession(key)) return;
         double remaining = std::clamp(deadline - SecondsNow(), 0.0, 0.2);
-        auto wait = std::chrono::milliseconds(static_cast<long long>(remaining * 1000.0));
-        std::unique_lock waiting(releaseMutex);
-        released.wait_for(waiting, wait, [&] { return releaseCount != seen; });
+        released.WaitForChange(seen, static_cast<DWORD>(remaining * 1000.0));
     } while (deadline > SecondsNow());
     TE_RAISE(TE_OPERATION_TIMED_OUT, "SessionBase::base_LockSession");
 }
@@ -185,11 +179,7 @@ void SessionBase::base_UnlockSession() {
     if (lockLevel < 1) TE_RAISE(TE_OPERATION_FAILED, "SessionBase::base_UnlockSession");
     if (--lockLevel == 0) {
         lockKey.Empty();
-        {
-            std::lock_guard wake(releaseMutex);
-            ++releaseCount;
-        }
-        released.notify_all();
+        released.Signal();
     }
 }
 

@@ -3,7 +3,6 @@
 // call these operations with converted arguments while holding objectLock.
 #pragma once
 
-#include <condition_variable>
 #include <cstdint>
 #include <memory>
 #include <mutex>
@@ -12,6 +11,7 @@
 
 #include "com/ComPtr.h"
 #include "com/Interfaces.h"
+#include "com/ReleaseSignal.h"
 #include "com/UniqueHandles.h"
 #include "framework/String.h"
 #include "sessions/SessionOwner.h"
@@ -113,9 +113,7 @@ private:
     ComPtr<IUnknown> ownerReference;
     // Waiters for the session lock sleep here between attempts; a release wakes them at once
     // instead of leaving them to their next poll.
-    std::mutex releaseMutex;
-    std::condition_variable released;
-    std::uint64_t releaseCount = 0;
+    ReleaseSignal released;
 };
 
 }  // namespace sm
