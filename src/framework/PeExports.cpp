@@ -18,14 +18,15 @@ namespace {
 }
 
 // Bounds-checked little-endian reads: every offset comes from the file and is trusted for nothing.
-// Bytes are fetched a page at a time as they are first needed.
+// Bytes are fetched a page at a time as they are first needed; a range is inside the file when its
+// last byte is.
 class ImageReader {
 public:
-    ImageReader(std::uint64_t imageSize, const ImageFetch& fetchBytes) : size(imageSize), fetch(fetchBytes) {}
+    explicit ImageReader(const ImageFetch& fetchBytes) : fetch(fetchBytes) {}
 
-    std::uint64_t Size() const { return size; }
-    void Require(std::uint64_t offset, std::uint64_t length) const {
-        if (offset > size || length > size - offset) RaiseBadFormat();
+    void Require(std::uint64_t offset, std::uint64_t length) {
+        std::uint64_t end = offset + length;
+        if (end < offset || (end > 0 && !HasByte(end - 1))) RaiseBadFormat();
     }
     std::uint32_t U16(std::uint64_t offset) {
         Require(offset, 2);
@@ -40,8 +41,7 @@ public:
         Require(offset, 1);
         std::string text;
         for (;; ++offset) {
-            if (offset >= size) RaiseBadFormat();  // no terminating zero before the end
-            char next = static_cast<char>(Byte(offset));
+            char next = static_cast<char>(Byte(offset));  // raises at the end: no terminating zero
             if (next == '\0') return text;
             text += next;
         }
@@ -51,28 +51,27 @@ private:
     static constexpr std::uint64_t pageSize = 4096;
     struct Page {
         std::uint64_t number;
-        std::vector<unsigned char> bytes;
+        std::vector<unsigned char> bytes;  // shorter than a page only at the end of the file
     };
 
-    unsigned char Byte(std::uint64_t offset) {
+    const Page& PageOf(std::uint64_t offset) {
         std::uint64_t number = offset / pageSize;
-        if (last == nullptr || last->number != number) {
-            last = nullptr;
-            for (Page& page : pages)
-                if (page.number == number) last = &page;
-            if (!last) last = &Load(number);
-        }
-        return last->bytes[offset - number * pageSize];
-    }
-    Page& Load(std::uint64_t number) {
-        std::uint64_t start = number * pageSize;
-        Page page{number, std::vector<unsigned char>(static_cast<std::size_t>(std::min(pageSize, size - start)))};
-        fetch(start, page.bytes);
+        if (last && last->number == number) return *last;
+        for (Page& page : pages)
+            if (page.number == number) return *(last = &page);
+        Page page{number, std::vector<unsigned char>(pageSize)};
+        std::size_t got = fetch(number * pageSize, page.bytes);
+        page.bytes.resize(std::min<std::size_t>(got, pageSize));
         pages.push_back(std::move(page));
-        return pages.back();
+        return *(last = &pages.back());
+    }
+    bool HasByte(std::uint64_t offset) { return offset % pageSize < PageOf(offset).bytes.size(); }
+    unsigned char Byte(std::uint64_t offset) {
+        const Page& page = PageOf(offset);
+        if (offset % pageSize >= page.bytes.size()) RaiseBadFormat();
+        return page.bytes[offset % pageSize];
     }
 
-    std::uint64_t size;
     const ImageFetch& fetch;
     std::deque<Page> pages;  // stable addresses while pages are added
     Page* last = nullptr;
@@ -100,14 +99,17 @@ bool IsExportNameStart(char first) {
 }  // namespace
 
 void ReadExportNames(std::span<const unsigned char> image, StringVector& names) {
-    ReadExportNames(image.size(), [&](std::uint64_t offset, std::span<unsigned char> into) {
-        std::memcpy(into.data(), image.data() + offset, into.size());
+    ReadExportNames([&](std::uint64_t offset, std::span<unsigned char> into) -> std::size_t {
+        if (offset >= image.size()) return 0;
+        std::size_t count = static_cast<std::size_t>(std::min<std::uint64_t>(into.size(), image.size() - offset));
+        std::memcpy(into.data(), image.data() + offset, count);
+        return count;
     }, names);
 }
 
-void ReadExportNames(std::uint64_t imageSize, const ImageFetch& fetch, StringVector& names) {
+void ReadExportNames(const ImageFetch& fetch, StringVector& names) {
     names.clear();
-    ImageReader reader(imageSize, fetch);
+    ImageReader reader(fetch);
     if (reader.U16(0) != 0x5A4D) RaiseBadFormat();  // "MZ"
     std::uint64_t peOffset = reader.U32(0x3C);
     if (reader.U32(peOffset) != 0x00004550) RaiseBadFormat();  // "PE\0\0"

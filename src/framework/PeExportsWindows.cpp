@@ -29,16 +29,24 @@ void ReadDLLExports(std::string_view path, StringVector& names) {
     OwnedHandle file{::CreateFileA(std::string(path).c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr, OPEN_EXISTING,
                                    FILE_ATTRIBUTE_NORMAL, nullptr)};
     if (file.handle == INVALID_HANDLE_VALUE) RaiseFileError(::GetLastError());
-    LARGE_INTEGER size{};
-    if (!::GetFileSizeEx(file.handle, &size)) RaiseFileError(::GetLastError());
-    ReadExportNames(static_cast<std::uint64_t>(size.QuadPart), [&](std::uint64_t offset, std::span<unsigned char> into) {
-        OVERLAPPED at{};
-        at.Offset = static_cast<DWORD>(offset);
-        at.OffsetHigh = static_cast<DWORD>(offset >> 32);
-        DWORD read = 0;
-        if (!::ReadFile(file.handle, into.data(), static_cast<DWORD>(into.size()), &read, &at)) RaiseFileError(::GetLastError());
-        // The file shrank while it was read: what is missing is outside the image.
-        if (read != into.size()) TE_RAISE(TE_BAD_FILE_FORMAT, "ReadDLLExports", RaiseDetails{.source = "readdll"});
+    // Reads at the file position, moving it only when a page is not the next one.
+    std::uint64_t position = 0;
+    ReadExportNames([&](std::uint64_t offset, std::span<unsigned char> into) -> std::size_t {
+        if (offset != position) {
+            LARGE_INTEGER to{};
+            to.QuadPart = static_cast<LONGLONG>(offset);
+            if (!::SetFilePointerEx(file.handle, to, nullptr, FILE_BEGIN)) RaiseFileError(::GetLastError());
+            position = offset;
+        }
+        std::size_t total = 0;
+        while (total < into.size()) {
+            DWORD wanted = static_cast<DWORD>(into.size() - total), read = 0;
+            if (!::ReadFile(file.handle, into.data() + total, wanted, &read, nullptr)) RaiseFileError(::GetLastError());
+            total += read;
+            if (read < wanted) break;  // a short read of a file: its end
+        }
+        position += total;
+        return total;
     }, names);
 }
 
