@@ -48,7 +48,8 @@ public:
     }
 
 private:
-    static constexpr std::uint64_t pageSize = 4096;
+    // Large enough that small images need one read, small against the images drivers ship as.
+    static constexpr std::uint64_t pageSize = 16384;
     struct Page {
         std::uint64_t number;
         std::vector<unsigned char> bytes;  // shorter than a page only at the end of the file

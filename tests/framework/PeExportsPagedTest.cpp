@@ -22,13 +22,13 @@ void Put32(std::vector<unsigned char>& bytes, std::size_t at, std::uint32_t valu
     for (int shift = 0; shift < 4; ++shift) bytes[at + shift] = static_cast<unsigned char>(value >> (8 * shift));
 }
 
-// A 64 KB image: headers at 0, one section whose raw bytes start at 0x3F00 (RVA 0x10000) with the
-// export directory, two name pointers and two names, the second starting before 0x4000 and ending
-// after it. Everything else is filler.
+// A 256 KB image: headers at 0, one section whose raw bytes start at 0xBF00 (RVA 0x10000) with the
+// export directory, two name pointers and two names, the second starting before 0xC000 (a page
+// boundary: pages are 16 KB) and ending after it. Everything else is filler.
 std::vector<unsigned char> StraddlingImage() {
-    std::vector<unsigned char> image(0x10000, 0xCC);
+    std::vector<unsigned char> image(0x40000, 0xCC);
     std::fill(image.begin(), image.begin() + 0x200, 0);
-    const std::uint32_t pe = 0x80, optional = pe + 24, section = optional + 240, raw = 0x3F00, rva = 0x10000;
+    const std::uint32_t pe = 0x80, optional = pe + 24, section = optional + 240, raw = 0xBF00, rva = 0x10000;
     Put16(image, 0, 0x5A4D);
     Put32(image, 0x3C, pe);
     Put32(image, pe, 0x00004550);
@@ -44,7 +44,7 @@ std::vector<unsigned char> StraddlingImage() {
     Put32(image, raw + 24, 2);         // two names
     Put32(image, raw + 32, rva + 40);  // name pointers right after the directory
     const char first[] = "drv_init";
-    const std::uint32_t secondAt = 0x4000 - raw - 6;  // six bytes before the page boundary
+    const std::uint32_t secondAt = 0xC000 - raw - 6;  // six bytes before the page boundary
     std::string second = "drv_close_with_a_long_name";
     Put32(image, raw + 40, rva + 48);
     Put32(image, raw + 44, rva + secondAt);
@@ -63,13 +63,13 @@ TEST(ExportNamesPaged, FetchesOnlyNeededPagesAndReadsNamesAcrossPageBoundaries) 
     ReadExportNames([&](std::uint64_t offset, std::span<unsigned char> into) -> std::size_t {
         std::size_t count = offset < image.size() ? std::min<std::size_t>(into.size(), image.size() - offset) : 0;
         std::memcpy(into.data(), image.data() + offset, count);
-        fetchedPages.insert(offset / 4096);
+        fetchedPages.insert(offset / 16384);
         fetchedBytes += count;
         return count;
     }, names);
     ASSERT_EQ(names.size(), 2u);
     EXPECT_EQ(std::string(names[0].View()), "drv_close_with_a_long_name");
     EXPECT_EQ(std::string(names[1].View()), "drv_init");
-    EXPECT_EQ(fetchedPages, (std::set<std::uint64_t>{0, 3, 4}));
-    EXPECT_EQ(fetchedBytes, 3u * 4096u);
+    EXPECT_EQ(fetchedPages, (std::set<std::uint64_t>{0, 2, 3}));
+    EXPECT_EQ(fetchedBytes, 3u * 16384u);
 }
