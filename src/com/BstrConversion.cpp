@@ -71,11 +71,17 @@ SAFEARRAY* CreateSafeArray(const StringVector& strings) {
     if (strings.size() > std::numeric_limits<ULONG>::max()) TE_RAISE(TE_PROGRAM_ERROR, "StringVector::CreateSafeArray");
     UniqueSafeArray array(::SafeArrayCreateVector(VT_BSTR, 0, static_cast<ULONG>(strings.size())));
     if (!array) TE_RAISE(TE_OUT_OF_MEMORY, "StringVector::CreateSafeArray");
-    for (LONG index = 0; index < static_cast<LONG>(strings.size()); ++index) {
-        UniqueBstr element(AllocSysString(strings[static_cast<std::size_t>(index)]));
-        // SafeArrayPutElement copies the BSTR; ours is freed by its owner.
-        HRESULT put = ::SafeArrayPutElement(array.Get(), &index, element.Get());
-        if (FAILED(put)) TE_RAISE(TE_OUT_OF_MEMORY, "StringVector::CreateSafeArray");
+    {
+        // Each new BSTR goes straight into its element (no copy per element); should one fail, the
+        // array frees those already placed. The access ends before the array can be destroyed.
+        BSTR* elements = nullptr;
+        if (FAILED(::SafeArrayAccessData(array.Get(), reinterpret_cast<void**>(&elements))))
+            TE_RAISE(TE_OUT_OF_MEMORY, "StringVector::CreateSafeArray");
+        struct Access {
+            SAFEARRAY* accessed;
+            ~Access() { ::SafeArrayUnaccessData(accessed); }
+        } access{array.Get()};
+        for (std::size_t index = 0; index < strings.size(); ++index) elements[index] = AllocSysString(strings[index]);
     }
     return array.Release();
 }
