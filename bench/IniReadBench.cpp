@@ -15,6 +15,7 @@
 #include <string>
 #include <vector>
 
+#include "BenchReport.h"
 #include "framework/IniObj.h"
 
 namespace {
@@ -117,5 +118,10 @@ int main() {
     std::printf("libinih, counting only     %8.1f MB/s  (%zu items)\n", megabytes / inihCount, counted);
     std::printf("ratio IniObj / libinih building document: %.2f\n", inihDocument / ours);
     std::printf("ratio IniObj / libinih counting only:     %.2f\n", inihCount / ours);
+    char figure[32], reference[32];
+    std::snprintf(figure, sizeof figure, "%.1f MB/s", megabytes / ours);
+    std::snprintf(reference, sizeof reference, "%.1f MB/s", megabytes / inihDocument);
+    bench::Row("P4", "IniObj reading a 10 MB file (native, speed)", figure, "libinih building the same document",
+               reference, inihDocument / ours, ">= 1.5");
     return failure == 0 ? 0 : 1;
 }

@@ -2,6 +2,7 @@
 
 #include <mbctype.h>
 
+#include <iterator>
 #include <limits>
 
 #include "com/ComError.h"
@@ -20,6 +21,16 @@ BSTR ConvertToBstr(std::string_view text, UINT codePage, const char* function) {
     if (text.size() > static_cast<std::size_t>(std::numeric_limits<int>::max()))
         TE_RAISE(TE_OUT_OF_MEMORY, function);
     int length = static_cast<int>(text.size());
+    // Short texts (names, keys) convert once into a buffer: a character never needs more than
+    // one wide character per byte.
+    wchar_t buffer[256];
+    if (length > 0 && length <= static_cast<int>(std::size(buffer))) {
+        int converted = ::MultiByteToWideChar(codePage, 0, text.data(), length, buffer, length);
+        if (converted == 0) TE_RAISE(TE_UNEXPECTED_SYSTEM_ERROR, function);
+        BSTR result = ::SysAllocStringLen(buffer, static_cast<UINT>(converted));
+        if (!result) TE_RAISE(TE_OUT_OF_MEMORY, function);
+        return result;
+    }
     int wideLength = length == 0 ? 0 : ::MultiByteToWideChar(codePage, 0, text.data(), length, nullptr, 0);
     if (length != 0 && wideLength == 0) TE_RAISE(TE_UNEXPECTED_SYSTEM_ERROR, function);
     BSTR result = ::SysAllocStringLen(nullptr, static_cast<UINT>(wideLength));
@@ -71,11 +82,17 @@ SAFEARRAY* CreateSafeArray(const StringVector& strings) {
     if (strings.size() > std::numeric_limits<ULONG>::max()) TE_RAISE(TE_PROGRAM_ERROR, "StringVector::CreateSafeArray");
     UniqueSafeArray array(::SafeArrayCreateVector(VT_BSTR, 0, static_cast<ULONG>(strings.size())));
     if (!array) TE_RAISE(TE_OUT_OF_MEMORY, "StringVector::CreateSafeArray");
-    for (LONG index = 0; index < static_cast<LONG>(strings.size()); ++index) {
-        UniqueBstr element(AllocSysString(strings[static_cast<std::size_t>(index)]));
-        // SafeArrayPutElement copies the BSTR; ours is freed by its owner.
-        HRESULT put = ::SafeArrayPutElement(array.Get(), &index, element.Get());
-        if (FAILED(put)) TE_RAISE(TE_OUT_OF_MEMORY, "StringVector::CreateSafeArray");
+    {
+        // Each new BSTR goes straight into its element (no copy per element); should one fail, the
+        // array frees those already placed. The access ends before the array can be destroyed.
+        BSTR* elements = nullptr;
+        if (FAILED(::SafeArrayAccessData(array.Get(), reinterpret_cast<void**>(&elements))))
+            TE_RAISE(TE_OUT_OF_MEMORY, "StringVector::CreateSafeArray");
+        struct Access {
+            SAFEARRAY* accessed;
+            ~Access() { ::SafeArrayUnaccessData(accessed); }
+        } access{array.Get()};
+        for (std::size_t index = 0; index < strings.size(); ++index) elements[index] = AllocSysString(strings[index]);
     }
     return array.Release();
 }

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstdint>
 #include <cstring>
+#include <deque>
 #include <set>
 #include <string>
 #include <vector>
@@ -17,41 +18,71 @@ namespace {
 }
 
 // Bounds-checked little-endian reads: every offset comes from the file and is trusted for nothing.
+// Bytes are fetched a page at a time as they are first needed; a range is inside the file when its
+// last byte is.
 class ImageReader {
 public:
-    explicit ImageReader(std::span<const unsigned char> bytes) : image(bytes) {}
+    explicit ImageReader(const ImageFetch& fetchBytes) : fetch(fetchBytes) {}
 
-    std::uint64_t Size() const { return image.size(); }
-    void Require(std::uint64_t offset, std::uint64_t length) const {
-        if (offset > image.size() || length > image.size() - offset) RaiseBadFormat();
+    void Require(std::uint64_t offset, std::uint64_t length) {
+        std::uint64_t end = offset + length;
+        if (end < offset || (end > 0 && !HasByte(end - 1))) RaiseBadFormat();
     }
-    std::uint32_t U16(std::uint64_t offset) const {
+    std::uint32_t U16(std::uint64_t offset) {
         Require(offset, 2);
-        return image[offset] | (image[offset + 1] << 8);
+        return Byte(offset) | (Byte(offset + 1) << 8);
     }
-    std::uint32_t U32(std::uint64_t offset) const {
+    std::uint32_t U32(std::uint64_t offset) {
         Require(offset, 4);
-        return static_cast<std::uint32_t>(image[offset]) | (static_cast<std::uint32_t>(image[offset + 1]) << 8) |
-               (static_cast<std::uint32_t>(image[offset + 2]) << 16) |
-               (static_cast<std::uint32_t>(image[offset + 3]) << 24);
+        return static_cast<std::uint32_t>(Byte(offset)) | (static_cast<std::uint32_t>(Byte(offset + 1)) << 8) |
+               (static_cast<std::uint32_t>(Byte(offset + 2)) << 16) | (static_cast<std::uint32_t>(Byte(offset + 3)) << 24);
     }
-    std::string_view Text(std::uint64_t offset) const {
+    std::string Text(std::uint64_t offset) {
         Require(offset, 1);
-        const void* end = std::memchr(image.data() + offset, '\0', image.size() - offset);
-        if (!end) RaiseBadFormat();
-        return {reinterpret_cast<const char*>(image.data() + offset),
-                static_cast<std::size_t>(static_cast<const unsigned char*>(end) - (image.data() + offset))};
+        std::string text;
+        for (;; ++offset) {
+            char next = static_cast<char>(Byte(offset));  // raises at the end: no terminating zero
+            if (next == '\0') return text;
+            text += next;
+        }
     }
 
 private:
-    std::span<const unsigned char> image;
+    // Large enough that small images need one read, small against the images drivers ship as.
+    static constexpr std::uint64_t pageSize = 16384;
+    struct Page {
+        std::uint64_t number;
+        std::vector<unsigned char> bytes;  // shorter than a page only at the end of the file
+    };
+
+    const Page& PageOf(std::uint64_t offset) {
+        std::uint64_t number = offset / pageSize;
+        if (last && last->number == number) return *last;
+        for (Page& page : pages)
+            if (page.number == number) return *(last = &page);
+        Page page{number, std::vector<unsigned char>(pageSize)};
+        std::size_t got = fetch(number * pageSize, page.bytes);
+        page.bytes.resize(std::min<std::size_t>(got, pageSize));
+        pages.push_back(std::move(page));
+        return *(last = &pages.back());
+    }
+    bool HasByte(std::uint64_t offset) { return offset % pageSize < PageOf(offset).bytes.size(); }
+    unsigned char Byte(std::uint64_t offset) {
+        const Page& page = PageOf(offset);
+        if (offset % pageSize >= page.bytes.size()) RaiseBadFormat();
+        return page.bytes[offset % pageSize];
+    }
+
+    const ImageFetch& fetch;
+    std::deque<Page> pages;  // stable addresses while pages are added
+    Page* last = nullptr;
 };
 
 struct Section {
     std::uint64_t virtualAddress, virtualSize, rawSize, rawOffset;
 };
 
-std::uint64_t RvaToOffset(const ImageReader& reader, const std::vector<Section>& sections, std::uint64_t rva) {
+std::uint64_t RvaToOffset(ImageReader& reader, const std::vector<Section>& sections, std::uint64_t rva) {
     for (const Section& section : sections) {
         std::uint64_t extent = std::max(section.virtualSize, section.rawSize);
         if (rva >= section.virtualAddress && rva < section.virtualAddress + extent) {
@@ -69,8 +100,17 @@ bool IsExportNameStart(char first) {
 }  // namespace
 
 void ReadExportNames(std::span<const unsigned char> image, StringVector& names) {
+    ReadExportNames([&](std::uint64_t offset, std::span<unsigned char> into) -> std::size_t {
+        if (offset >= image.size()) return 0;
+        std::size_t count = static_cast<std::size_t>(std::min<std::uint64_t>(into.size(), image.size() - offset));
+        std::memcpy(into.data(), image.data() + offset, count);
+        return count;
+    }, names);
+}
+
+void ReadExportNames(const ImageFetch& fetch, StringVector& names) {
     names.clear();
-    ImageReader reader(image);
+    ImageReader reader(fetch);
     if (reader.U16(0) != 0x5A4D) RaiseBadFormat();  // "MZ"
     std::uint64_t peOffset = reader.U32(0x3C);
     if (reader.U32(peOffset) != 0x00004550) RaiseBadFormat();  // "PE\0\0"
@@ -104,8 +144,8 @@ void ReadExportNames(std::span<const unsigned char> image, StringVector& names) 
 
     std::set<std::string, std::less<>> unique;
     for (std::uint64_t index = 0; index < nameCount; ++index) {
-        std::string_view name = reader.Text(RvaToOffset(reader, sections, reader.U32(nameTable + index * 4)));
-        if (!name.empty() && IsExportNameStart(name[0])) unique.emplace(name);
+        std::string name = reader.Text(RvaToOffset(reader, sections, reader.U32(nameTable + index * 4)));
+        if (!name.empty() && IsExportNameStart(name[0])) unique.emplace(std::move(name));
     }
     for (const auto& name : unique) names.emplace_back(std::string_view(name));
 }

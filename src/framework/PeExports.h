@@ -2,6 +2,8 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
+#include <functional>
 #include <span>
 #include <string_view>
 
@@ -14,8 +16,15 @@ namespace sm {
 // reference outside the bytes raises TE_BAD_FILE_FORMAT from "ReadDLLExports".
 void ReadExportNames(std::span<const unsigned char> image, StringVector& names);
 
-// Maps the file read-only and reads its export names; the mapping is always released. A file that
-// cannot be opened raises the mapped file error.
+// The same over an image whose bytes are fetched on demand: fetch(offset, into) fills into with the
+// bytes at offset and returns how many it gave, fewer only at the end of the file. Only the pages
+// that hold the headers, the export directory and the names are fetched; the file's size is never
+// asked for (a reference past the end shows as a short fetch).
+using ImageFetch = std::function<std::size_t(std::uint64_t offset, std::span<unsigned char> into)>;
+void ReadExportNames(const ImageFetch& fetch, StringVector& names);
+
+// Reads the export names from the file's headers and export table only. A file that cannot be
+// opened or read raises the mapped file error.
 void ReadDLLExports(std::string_view path, StringVector& names);
 
 }  // namespace sm

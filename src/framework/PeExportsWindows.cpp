@@ -1,5 +1,6 @@
-// Reading an image file for ReadDLLExports on Windows: a read-only mapping, never a load, so a
-// driver's own start-up code never runs while the directory is scanned.
+// Reading an image file for ReadDLLExports on Windows: plain reads of the pages that hold the
+// headers, the export directory and the names, never a load (a driver's own start-up code never
+// runs while the directory is scanned) and never the rest of the file.
 #include <windows.h>
 
 #include <string>
@@ -10,12 +11,6 @@
 namespace sm {
 
 namespace {
-struct MappedView {
-    const void* view = nullptr;
-    ~MappedView() {
-        if (view) ::UnmapViewOfFile(view);
-    }
-};
 struct OwnedHandle {
     HANDLE handle = nullptr;
     ~OwnedHandle() {
@@ -34,18 +29,25 @@ void ReadDLLExports(std::string_view path, StringVector& names) {
     OwnedHandle file{::CreateFileA(std::string(path).c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr, OPEN_EXISTING,
                                    FILE_ATTRIBUTE_NORMAL, nullptr)};
     if (file.handle == INVALID_HANDLE_VALUE) RaiseFileError(::GetLastError());
-    LARGE_INTEGER size{};
-    if (!::GetFileSizeEx(file.handle, &size)) RaiseFileError(::GetLastError());
-    // An empty file cannot be mapped; it is simply not an image.
-    if (size.QuadPart == 0) {
-        ReadExportNames({}, names);
-        return;
-    }
-    OwnedHandle mapping{::CreateFileMappingA(file.handle, nullptr, PAGE_READONLY, 0, 0, nullptr)};
-    if (!mapping.handle) RaiseFileError(::GetLastError());
-    MappedView view{::MapViewOfFile(mapping.handle, FILE_MAP_READ, 0, 0, 0)};
-    if (!view.view) RaiseFileError(::GetLastError());
-    ReadExportNames({static_cast<const unsigned char*>(view.view), static_cast<std::size_t>(size.QuadPart)}, names);
+    // Reads at the file position, moving it only when a page is not the next one.
+    std::uint64_t position = 0;
+    ReadExportNames([&](std::uint64_t offset, std::span<unsigned char> into) -> std::size_t {
+        if (offset != position) {
+            LARGE_INTEGER to{};
+            to.QuadPart = static_cast<LONGLONG>(offset);
+            if (!::SetFilePointerEx(file.handle, to, nullptr, FILE_BEGIN)) RaiseFileError(::GetLastError());
+            position = offset;
+        }
+        std::size_t total = 0;
+        while (total < into.size()) {
+            DWORD wanted = static_cast<DWORD>(into.size() - total), read = 0;
+            if (!::ReadFile(file.handle, into.data() + total, wanted, &read, nullptr)) RaiseFileError(::GetLastError());
+            total += read;
+            if (read < wanted) break;  // a short read of a file: its end
+        }
+        position += total;
+        return total;
+    }, names);
 }
 
 }  // namespace sm

@@ -133,17 +133,12 @@ STDMETHODIMP CInstrSessionMgr::GetInstrSession(BSTR name, VARIANT_BOOL newSessio
 bool CInstrSessionMgr::FindExistingSession(std::string_view category, std::string_view name,
                                            ComPtr<IInstrSession>& found) {
     CriticalSectionGuard guard(lock);
-    for (const TableEntry& entry : sessions) {
-        // Name and category are read under the session's lock: another thread may be renaming it. The
-        // category compared is the one the session was created with (an IVI session shows its class too).
-        CriticalSectionGuard sessionGuard(entry.base->objectLock);
-        DynamicString sessionCategory(entry.base->Category().View());
-        if (!IsAnyCategory(category) && !SameCategory(category, sessionCategory.View())) continue;
-        if (!entry.base->HasName(name)) continue;
-        found = ComPtr<IInstrSession>(entry.session);
-        return true;
-    }
-    return false;
+    // The index gives the session a scan of the table in order would give, without asking each.
+    sessionIndex.CatchUp(sessions);
+    IInstrSession* session = sessionIndex.Find(category, name);
+    if (!session) return false;
+    found = ComPtr<IInstrSession>(session);
+    return true;
 }
 
 template <class Session>
@@ -235,8 +230,9 @@ void CInstrSessionMgr::MakeSessionNameUnique(SessionBase& session) {
 
 void CInstrSessionMgr::RemoveSession(SessionBase& session) {
     CriticalSectionGuard guard(lock);
-    for (std::size_t index = sessions.size(); index-- > 0;)
-        if (sessions[index].base == &session) sessions.erase(sessions.begin() + static_cast<std::ptrdiff_t>(index));
+    for (std::size_t position = sessions.size(); position-- > 0;)
+        if (sessions[position].base == &session) sessions.erase(sessions.begin() + static_cast<std::ptrdiff_t>(position));
+    sessionIndex.Remove(session);
 }
 
 // ---- process switches -----------------------------------------------------------------------------

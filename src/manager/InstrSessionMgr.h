@@ -10,6 +10,7 @@
 #include "com/Implements.h"
 #include "com/Interfaces.h"
 #include "com/UniqueHandles.h"
+#include "manager/SessionIndex.h"
 #include "sessions/SessionBase.h"
 #include "sources/IviInfo.h"
 #include "sources/RQInfo.h"
@@ -47,6 +48,7 @@ public:
     void UnlockTable() override { lock.Unlock(); }
     void RemoveSession(SessionBase& session) override;
     IUnknown* OwnerIdentity() override { return Identity(); }
+    void SessionNamesChanged(SessionBase& session) override { sessionIndex.NoteRenamed(session); }
 
     // Name rules that depend on this manager's hidden categories.
     bool IsVisibleCategoryName(std::string_view text) const;
@@ -90,6 +92,7 @@ private:
 
     CriticalSection lock;
     std::vector<TableEntry> sessions;
+    SessionIndex sessionIndex;  // follows sessions; see FindExistingSession
     VxipnpInfo vxipnpInfo;
     IviInfo iviInfo;
     RQInfo rqInfo;

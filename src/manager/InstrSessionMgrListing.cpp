@@ -1,4 +1,6 @@
 // Listing names, sessions and categories, hiding categories and describing the manager's state.
+#include <iterator>
+
 #include "com/BstrConversion.h"
 #include "framework/TEException.h"
 #include "manager/InstrSessionMgr.h"
@@ -15,8 +17,9 @@ namespace {
 
 void PrefixNames(std::string_view token, StringVector& names) {
     for (auto& name : names) {
-        name.Insert("::", 0);
-        name.Insert(token, 0);
+        DynamicString prefixed(token);
+        prefixed.Append("::").Append(name);
+        name = std::move(prefixed);
     }
 }
 }  // namespace
@@ -55,7 +58,7 @@ void CInstrSessionMgr::GetConfigurationNames(std::string_view argument, std::uin
         StringVector names;
         source.ListNames(subCategory.View(), options, filters, names);
         if (includePrefix) PrefixNames(token, names);
-        result.insert(result.end(), names.begin(), names.end());
+        result.insert(result.end(), std::make_move_iterator(names.begin()), std::make_move_iterator(names.end()));
         matched = true;
     };
     if (applies(CategoryIVI)) collect(iviInfo, CategoryIVI);

@@ -9,6 +9,7 @@
 #pragma once
 
 #include <string>
+#include <type_traits>
 
 #include "com/BstrConversion.h"
 #include "com/Implements.h"
@@ -18,6 +19,14 @@
 #include "sources/SessionName.h"
 
 namespace sm {
+
+// The class that declares a member function, from the type of a pointer to it.
+template <class Member>
+struct MemberClass;
+template <class Class, class Result, class... Arguments>
+struct MemberClass<Result (Class::*)(Arguments...) const> {
+    using Type = Class;
+};
 
 inline VARIANT_BOOL ToVariantBool(bool value) { return value ? VARIANT_TRUE : VARIANT_FALSE; }
 
@@ -163,6 +172,18 @@ public:
     }
 
     IInstrSession* Self() { return static_cast<IInstrSession*>(this); }
+
+    // The names are complete only when the class that decides HasName also lists them.
+    bool ListNames(StringVector& names) const override {
+        using HasNameClass = typename MemberClass<decltype(&Session::HasName)>::Type;
+        using AppendNamesClass = typename MemberClass<decltype(&Session::AppendNames)>::Type;
+        if constexpr (!std::is_same_v<HasNameClass, AppendNamesClass>) {
+            return false;
+        } else {
+            static_cast<const Session*>(this)->AppendNames(names);
+            return true;
+        }
+    }
 
     // "CCustomInstrSession::Close": how raise sites of a session class name themselves.
     static std::string QualifiedName(const char* method) { return std::string(Session::ClassName()) + "::" + method; }

@@ -181,18 +181,12 @@ void SessionBase::base_LockSession(std::string_view key, double timeoutSeconds) 
     if (key.empty()) TE_RAISE(TE_INVALID_OR_OUT_OF_RANGE, "SessionBase::base_LockSession");
     double deadline = timeoutSeconds < 0 ? std::numeric_limits<double>::max() : start + timeoutSeconds;
     do {
-        std::uint64_t seen;
-        {
-            std::lock_guard guard(releaseMutex);
-            seen = releaseCount;
-        }
+        std::uint64_t seen = released.Count();
         if (TryLockSession(key)) return;
         // Written so that a NaN timeout (a NaN deadline) waits no time instead of converting NaN.
         double remaining = deadline - SecondsNow();
         remaining = remaining > 0.2 ? 0.2 : remaining > 0.0 ? remaining : 0.0;
-        auto wait = std::chrono::milliseconds(static_cast<long long>(remaining * 1000.0));
-        std::unique_lock waiting(releaseMutex);
-        released.wait_for(waiting, wait, [&] { return releaseCount != seen; });
+        released.WaitForChange(seen, static_cast<DWORD>(remaining * 1000.0));
     } while (deadline > SecondsNow());
     TE_RAISE(TE_OPERATION_TIMED_OUT, "SessionBase::base_LockSession");
 }
@@ -202,11 +196,7 @@ void SessionBase::base_UnlockSession() {
     if (lockLevel < 1) TE_RAISE(TE_OPERATION_FAILED, "SessionBase::base_UnlockSession");
     if (--lockLevel == 0) {
         lockKey.Empty();
-        {
-            std::lock_guard wake(releaseMutex);
-            ++releaseCount;
-        }
-        released.notify_all();
+        released.Signal();
     }
 }
 

@@ -3,7 +3,6 @@
 // call these operations with converted arguments while holding objectLock.
 #pragma once
 
-#include <condition_variable>
 #include <cstdint>
 #include <memory>
 #include <mutex>
@@ -12,6 +11,7 @@
 
 #include "com/ComPtr.h"
 #include "com/Interfaces.h"
+#include "com/ReleaseSignal.h"
 #include "com/UniqueHandles.h"
 #include "framework/String.h"
 #include "sessions/SessionOwner.h"
@@ -42,9 +42,20 @@ public:
     virtual void GetCategory(String& result) const { result.Assign(category); }
     // The category as the session was created with it; GetCategory may add a sub-category.
     const String& Category() const { return category; }
-    virtual void SetName(const String& value) { name.Assign(value); }
-    virtual void SetCategory(const String& value) { category.Assign(value); }
+    virtual void SetName(const String& value) {
+        name.Assign(value);
+        if (owner) owner->SessionNamesChanged(*this);
+    }
+    virtual void SetCategory(const String& value) {
+        category.Assign(value);
+        if (owner) owner->SessionNamesChanged(*this);
+    }
     virtual bool HasName(std::string_view candidate) const;
+    // Every name HasName accepts, for the manager's lookup index. A class that overrides HasName
+    // overrides AppendNames in the same class, or its sessions are found by scanning instead.
+    virtual void AppendNames(StringVector& names) const { names.push_back(name); }
+    // False when AppendNames may miss names HasName accepts (see InstrSession::ListNames).
+    virtual bool ListNames(StringVector&) const { return false; }
     virtual bool AcceptsSubcategory(std::string_view subCategory) const;
 
     // Set by the manager right after creation; the session keeps a counted reference on it.
@@ -123,9 +134,7 @@ private:
     ComPtr<IUnknown> ownerReference;
     // Waiters for the session lock sleep here between attempts; a release wakes them at once
     // instead of leaving them to their next poll.
-    std::mutex releaseMutex;
-    std::condition_variable released;
-    std::uint64_t releaseCount = 0;
+    ReleaseSignal released;
     // Guarded by objectLock.
     std::uint32_t callDepth = 0;
     std::vector<ComPtr<IUnknown>> droppedObjects;

@@ -15,6 +15,9 @@ public:
     virtual void RemoveSession(SessionBase& session) = 0;
     // The owner's identity, for the counted reference each session keeps on it.
     virtual IUnknown* OwnerIdentity() = 0;
+    // The session's name or category changed: what the owner derived from them is out of date.
+    // Called with the session's own lock held, never the table lock; must not block.
+    virtual void SessionNamesChanged(SessionBase&) {}
 
 protected:
     ~SessionOwner() = default;

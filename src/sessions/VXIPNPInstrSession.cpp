@@ -15,6 +15,11 @@ bool CVXIPNPInstrSession::HasName(std::string_view candidate) const {
     return SessionBase::HasName(candidate) || ContainsName(vinstr.names, candidate);
 }
 
+void CVXIPNPInstrSession::AppendNames(StringVector& names) const {
+    SessionBase::AppendNames(names);
+    for (const auto& entry : vinstr.names) names.push_back(entry.name);
+}
+
 void CVXIPNPInstrSession::LoadDLL() {
     LoadLibraryOnce(vinstr.modulePath.GetText(), "CVXIPNPInstrSession::LoadDLL", [&] {
         const std::string prefix(vinstr.prefix.View());

@@ -26,6 +26,7 @@ public:
 
     // A logical name finds the session of its virtual instrument, and the instrument name too.
     bool HasName(std::string_view candidate) const override;
+    void AppendNames(StringVector& names) const override;
     void PrepareVPPBase() override;
     ViSession GetVPPSession() override;
 

@@ -1,6 +1,7 @@
 #include <windows.h>
 
 #include <algorithm>
+#include <cctype>
 #include <cstdio>
 
 #include "com/UniqueHandles.h"
@@ -68,26 +69,39 @@ std::string Join(std::string_view directory, std::string_view name) {
     return path.append(name);
 }
 
-// Names of the entries of a folder matching pattern, sorted so every machine lists alike.
-std::vector<std::string> Entries(std::string_view directory, const char* pattern, bool directories) {
-    std::vector<std::string> names;
+bool HasDllExtension(std::string_view name) {
+    constexpr std::string_view extension = ".dll";
+    if (name.size() < extension.size()) return false;
+    std::string_view tail = name.substr(name.size() - extension.size());
+    for (std::size_t index = 0; index < extension.size(); ++index)
+        if (static_cast<char>(std::tolower(static_cast<unsigned char>(tail[index]))) != extension[index]) return false;
+    return true;
+}
+
+// One pass over a folder: its image files ("*.dll") and its subfolders, each sorted so every
+// machine lists alike.
+void Entries(std::string_view directory, std::vector<std::string>& images, std::vector<std::string>& folders) {
     WIN32_FIND_DATAA data{};
-    FindHandle find{::FindFirstFileA(Join(directory, pattern).c_str(), &data)};
-    if (find.handle == INVALID_HANDLE_VALUE) return names;
+    FindHandle find{::FindFirstFileA(Join(directory, "*").c_str(), &data)};
+    if (find.handle == INVALID_HANDLE_VALUE) return;
     do {
-        bool isDirectory = (data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0;
         std::string_view name = data.cFileName;
-        if (isDirectory != directories || name == "." || name == "..") continue;
-        names.emplace_back(name);
+        if (data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) {
+            if (name != "." && name != "..") folders.emplace_back(name);
+        } else if (HasDllExtension(name)) {
+            images.emplace_back(name);
+        }
     } while (::FindNextFileA(find.handle, &data));
-    std::sort(names.begin(), names.end());
-    return names;
+    std::sort(images.begin(), images.end());
+    std::sort(folders.begin(), folders.end());
 }
 }  // namespace
 
 void ListDllFiles(std::string_view directory, std::vector<std::string>& files) {
-    for (const auto& name : Entries(directory, "*.dll", false)) files.push_back(Join(directory, name));
-    for (const auto& folder : Entries(directory, "*", true)) ListDllFiles(Join(directory, folder), files);
+    std::vector<std::string> images, folders;
+    Entries(directory, images, folders);
+    for (const auto& name : images) files.push_back(Join(directory, name));
+    for (const auto& folder : folders) ListDllFiles(Join(directory, folder), files);
 }
 
 }  // namespace sm::configuration

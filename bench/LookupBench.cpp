@@ -1,0 +1,314 @@
+// Session lookup, late binding, memory per session and name listing through the registered DLL,
+// each against its reference in the same run (see docs/benchmarks.md):
+//
+//   P1  GetInstrSession hit with 1,000 live sessions of mixed categories / with 1 live session
+//   P3  late-bound GetInstrSession hit / late-bound IsInitialized, both through IDispatch::Invoke
+//   M1  private bytes per live custom session, 10,000 sessions with two data items each
+//   P7  GetNames("") over 10,000 VXIplug&play names / building the same SAFEARRAY from a vector
+//       (a partial figure: the VISA, IVI and switch sources are not part of this build's setup)
+//
+// Prints ROW lines (bench/BenchReport.h) and a few notes.
+#include <windows.h>
+#include <psapi.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <fstream>
+#include <functional>
+#include <string>
+#include <vector>
+
+#include "BenchReport.h"
+#include "com/ComPtr.h"
+#include "com/Interfaces.h"
+#include "com/UniqueHandles.h"
+
+using namespace sm;
+
+namespace {
+
+constexpr int otherSessions = 999;        // with the target: 1,000 live sessions
+constexpr int configuredInstruments = 5000;  // and as many logical names: 10,000 names
+constexpr int memorySessions = 10000;
+
+[[noreturn]] void Fail(const char* what, HRESULT result) {
+    std::printf("%s failed: HRESULT 0x%08lX\n", what, static_cast<unsigned long>(result));
+    std::exit(1);
+}
+
+void Check(HRESULT result, const char* what) {
+    if (FAILED(result)) Fail(what, result);
+}
+
+UniqueBstr Bstr(const std::wstring& text) { return UniqueBstr(::SysAllocString(text.c_str())); }
+
+double Now() {
+    static LARGE_INTEGER frequency = [] {
+        LARGE_INTEGER value;
+        ::QueryPerformanceFrequency(&value);
+        return value;
+    }();
+    LARGE_INTEGER counter;
+    ::QueryPerformanceCounter(&counter);
+    return static_cast<double>(counter.QuadPart) / static_cast<double>(frequency.QuadPart);
+}
+
+// Time per call of the fastest batch: on a loaded machine the fastest batch is the one least
+// disturbed by other processes.
+double BestBatch(const std::function<void()>& call, int callsPerBatch) {
+    double start = Now();
+    for (int index = 0; index < callsPerBatch; ++index) call();
+    return (Now() - start) / callsPerBatch;
+}
+
+struct Pair {
+    double figure = 1e30;
+    double reference = 1e30;
+};
+
+// Figure and reference batches alternate so that both see the same load.
+Pair Interleaved(const std::function<void()>& figure, const std::function<void()>& reference, int callsPerBatch,
+                 int batches) {
+    Pair best;
+    for (int batch = 0; batch < batches; ++batch) {
+        best.figure = std::min(best.figure, BestBatch(figure, callsPerBatch));
+        best.reference = std::min(best.reference, BestBatch(reference, callsPerBatch));
+    }
+    return best;
+}
+
+std::string Micro(double seconds) {
+    char text[64];
+    std::snprintf(text, sizeof text, "%.2f us", seconds * 1e6);
+    return text;
+}
+
+std::size_t PrivateBytes() {
+    PROCESS_MEMORY_COUNTERS_EX counters{};
+    counters.cb = sizeof counters;
+    ::GetProcessMemoryInfo(::GetCurrentProcess(), reinterpret_cast<PROCESS_MEMORY_COUNTERS*>(&counters), sizeof counters);
+    return counters.PrivateUsage;
+}
+
+// Bytes in use on every heap of the process (blocks and their overhead): under Wine the private
+// bytes counter stays 0, the heaps are where a session's memory lives.
+std::size_t HeapBytes() {
+    std::vector<HANDLE> heaps(::GetProcessHeaps(0, nullptr) + 16);
+    heaps.resize(::GetProcessHeaps(static_cast<DWORD>(heaps.size()), heaps.data()));
+    std::size_t total = 0;
+    for (HANDLE heap : heaps) {
+        if (!::HeapLock(heap)) continue;
+        PROCESS_HEAP_ENTRY entry{};
+        while (::HeapWalk(heap, &entry))
+            if (entry.wFlags & PROCESS_HEAP_ENTRY_BUSY) total += entry.cbData + entry.cbOverhead;
+        ::HeapUnlock(heap);
+    }
+    return total;
+}
+
+struct Memory {
+    std::size_t privateBytes = PrivateBytes();
+    std::size_t heapBytes = HeapBytes();
+};
+
+// Per item: private bytes where the platform counts them, else heap bytes; says which.
+double PerItem(const Memory& before, const Memory& after, std::size_t items, const char*& kind) {
+    if (after.privateBytes > before.privateBytes) {
+        kind = "private bytes";
+        return static_cast<double>(after.privateBytes - before.privateBytes) / static_cast<double>(items);
+    }
+    kind = "heap bytes (private bytes read 0 here)";
+    return static_cast<double>(after.heapBytes - before.heapBytes) / static_cast<double>(items);
+}
+
+// A VXIplug&play directory whose configuration file names configuredInstruments virtual
+// instruments and one logical name for each.
+void WriteConfiguration() {
+    char temp[MAX_PATH];
+    ::GetTempPathA(MAX_PATH, temp);
+    std::string root = std::string(temp) + "SessionMgrLookupBench";
+    ::CreateDirectoryA(root.c_str(), nullptr);
+    ::CreateDirectoryA((root + "\\Win64").c_str(), nullptr);
+    std::ofstream file(root + "\\Win64\\QVSessionMgr.ini", std::ios::binary);
+    file << "[VXIPNP Logical Names]\r\n";
+    for (int index = 0; index < configuredInstruments; ++index)
+        file << "Logical" << index << " = \"VPPVInstr->VInstr" << index << "\"\r\n";
+    file << "\r\n";
+    for (int index = 0; index < configuredInstruments; ++index)
+        file << "[VPPVInstr->VInstr" << index << "]\r\nModulePath = \"C:\\\\VXIPNP\\\\Win64\\\\Bin\\\\simdmm_64.dll\"\r\n"
+             << "Prefix = \"simdmm\"\r\nResource = \"GPIB0::" << (index % 31) << "::INSTR\"\r\nIDQuery = True\r\nReset = True\r\n\r\n";
+    file.close();
+    ::SetEnvironmentVariableA("VXIPNPPATH", root.c_str());
+}
+
+ComPtr<IInstrSession> Get(IInstrSessionMgr* manager, const std::wstring& name) {
+    ComPtr<IInstrSession> session;
+    auto text = Bstr(name);
+    HRESULT result = manager->GetInstrSession(text.Get(), VARIANT_FALSE, session.Put());
+    if (FAILED(result)) {
+        std::printf("GetInstrSession(\"%ls\"):\n", name.c_str());
+        Fail("GetInstrSession", result);
+    }
+    return session;
+}
+
+DISPID DispatchId(IDispatch* object, const wchar_t* name) {
+    DISPID id = 0;
+    auto* names = const_cast<LPOLESTR>(name);
+    Check(object->GetIDsOfNames(IID_NULL, &names, 1, LOCALE_USER_DEFAULT, &id), "GetIDsOfNames");
+    return id;
+}
+
+void LookupAndLateBinding(IInstrSessionMgr* manager) {
+    const std::wstring targetName = L"CUSTOM::LookupTarget";
+    auto target = Get(manager, targetName);
+    auto targetText = Bstr(targetName);
+    auto hit = [&] {
+        IInstrSession* found = nullptr;
+        Check(manager->GetInstrSession(targetText.Get(), VARIANT_FALSE, &found), "GetInstrSession hit");
+        found->Release();
+    };
+
+    // P1: the target is the only session, then the last of 1,000 of mixed categories; three rounds.
+    Pair p1;
+    for (int round = 0; round < 3; ++round) {
+        for (int batch = 0; batch < 5; ++batch) p1.reference = std::min(p1.reference, BestBatch(hit, 2000));
+        std::vector<ComPtr<IInstrSession>> others;
+        for (int index = 0; index < otherSessions; ++index) {
+            static const wchar_t* const categories[] = {L"CUSTOM::Other", L"RQ::Other", L"VXIPNP::VInstr"};
+            others.push_back(Get(manager, categories[index % 3] + std::to_wstring(index)));
+        }
+        target.Reset();
+        target = Get(manager, targetName);  // now the last of the table
+        for (int batch = 0; batch < 5; ++batch) p1.figure = std::min(p1.figure, BestBatch(hit, 2000));
+        others.clear();
+    }
+    bench::Row("P1", "GetInstrSession hit, 1,000 live sessions (CUSTOM, RQ, VXIPNP)", Micro(p1.figure).c_str(),
+               "the same with 1 live session", Micro(p1.reference).c_str(), p1.figure / p1.reference, "<= 1.2");
+
+    // P3: both calls through IDispatch::Invoke with their dispatch ids looked up once, as a
+    // compiled late-bound client calls them.
+    ComPtr<IDispatch> managerDispatch, sessionDispatch;
+    Check(manager->QueryInterface(IID_IDispatch, managerDispatch.PutVoid()), "QueryInterface(IDispatch) manager");
+    Check(target->QueryInterface(IID_IDispatch, sessionDispatch.PutVoid()), "QueryInterface(IDispatch) session");
+    DISPID getId = DispatchId(managerDispatch.Get(), L"GetInstrSession");
+    DISPID isInitializedId = DispatchId(sessionDispatch.Get(), L"IsInitialized");
+    auto lateGet = [&] {
+        VARIANT arguments[2];
+        arguments[1].vt = VT_BSTR;  // arguments go in reverse order
+        arguments[1].bstrVal = targetText.Get();
+        arguments[0].vt = VT_BOOL;
+        arguments[0].boolVal = VARIANT_FALSE;
+        DISPPARAMS parameters{arguments, nullptr, 2, 0};
+        VARIANT result;
+        ::VariantInit(&result);
+        Check(managerDispatch->Invoke(getId, IID_NULL, LOCALE_USER_DEFAULT, DISPATCH_METHOD, &parameters, &result,
+                                      nullptr, nullptr),
+              "Invoke GetInstrSession");
+        ::VariantClear(&result);
+    };
+    auto lateIsInitialized = [&] {
+        DISPPARAMS parameters{nullptr, nullptr, 0, 0};
+        VARIANT result;
+        ::VariantInit(&result);
+        Check(sessionDispatch->Invoke(isInitializedId, IID_NULL, LOCALE_USER_DEFAULT, DISPATCH_METHOD, &parameters,
+                                      &result, nullptr, nullptr),
+              "Invoke IsInitialized");
+        ::VariantClear(&result);
+    };
+    Pair p3 = Interleaved(lateGet, lateIsInitialized, 2000, 15);
+    bench::Row("P3", "late-bound GetInstrSession hit (Invoke)", Micro(p3.figure).c_str(),
+               "late-bound IsInitialized (Invoke)", Micro(p3.reference).c_str(), p3.figure / p3.reference, "<= 2.0");
+    Pair early = Interleaved(hit, [&] {
+        VARIANT_BOOL value;
+        Check(target->IsInitialized(&value), "IsInitialized");
+    }, 2000, 5);
+    std::printf("NOTE|early-bound: GetInstrSession hit %s, IsInitialized %s\n", Micro(early.figure).c_str(),
+                Micro(early.reference).c_str());
+}
+
+void MemoryPerSession(IInstrSessionMgr* manager) {
+    auto itemOne = Bstr(L"Channel");
+    auto itemTwo = Bstr(L"Description");
+    auto text = Bstr(L"bench item text");
+    std::vector<ComPtr<IInstrSession>> sessions;
+    sessions.reserve(memorySessions);
+    Memory before;
+    for (int index = 0; index < memorySessions; ++index) {
+        auto session = Get(manager, L"CUSTOM::Memory" + std::to_wstring(index));
+        Check(session->AttachLong(itemOne.Get(), index), "AttachLong");
+        Check(session->AttachString(itemTwo.Get(), text.Get()), "AttachString");
+        sessions.push_back(std::move(session));
+    }
+    Memory after;
+    const char* kind = "";
+    double perSession = PerItem(before, after, memorySessions, kind);
+    char figure[128], value[64];
+    std::snprintf(figure, sizeof figure, "%s per live custom session (10,000 x 2 data items)", kind);
+    std::snprintf(value, sizeof value, "%.0f B", perSession);
+    bench::Row("M1", figure, value, "the goal", "2048 B", perSession / 2048.0, "<= 1.0");
+}
+
+void ListNames(IInstrSessionMgr* manager) {
+    auto all = Bstr(L"");
+    auto noFilter = Bstr(L"");
+    auto flags = static_cast<GetNamesOptions>(ReturnLogicalNames | ReturnVirtualInstruments | IncludeCategoryPrefix);
+    Memory before;
+    SAFEARRAY* first = nullptr;
+    Check(manager->GetNames(all.Get(), flags, noFilter.Get(), &first), "GetNames");
+    Memory after;
+    LONG lower = 0, upper = -1;
+    ::SafeArrayGetLBound(first, 1, &lower);
+    ::SafeArrayGetUBound(first, 1, &upper);
+    std::vector<std::wstring> names;
+    BSTR* elements = nullptr;
+    Check(::SafeArrayAccessData(first, reinterpret_cast<void**>(&elements)), "SafeArrayAccessData");
+    for (LONG index = 0; index <= upper - lower; ++index) names.emplace_back(elements[index], ::SysStringLen(elements[index]));
+    ::SafeArrayUnaccessData(first);
+    ::SafeArrayDestroy(first);
+
+    auto listing = [&] {
+        SAFEARRAY* result = nullptr;
+        Check(manager->GetNames(all.Get(), flags, noFilter.Get(), &result), "GetNames");
+        ::SafeArrayDestroy(result);
+    };
+    auto building = [&] {
+        SAFEARRAY* result = ::SafeArrayCreateVector(VT_BSTR, 0, static_cast<ULONG>(names.size()));
+        BSTR* data = nullptr;
+        ::SafeArrayAccessData(result, reinterpret_cast<void**>(&data));
+        for (std::size_t index = 0; index < names.size(); ++index)
+            data[index] = ::SysAllocStringLen(names[index].data(), static_cast<UINT>(names[index].size()));
+        ::SafeArrayUnaccessData(result);
+        ::SafeArrayDestroy(result);
+    };
+    Pair p7 = Interleaved(listing, building, 3, 7);
+    char figure[96];
+    std::snprintf(figure, sizeof figure, "GetNames(\"\") over %zu names (partial: VXIplug&play names only)", names.size());
+    char figureValue[32], referenceValue[32];
+    std::snprintf(figureValue, sizeof figureValue, "%.2f ms", p7.figure * 1e3);
+    std::snprintf(referenceValue, sizeof referenceValue, "%.2f ms", p7.reference * 1e3);
+    bench::Row("P7", figure, figureValue, "the same SAFEARRAY of BSTRs built from a vector", referenceValue,
+               p7.figure / p7.reference, "<= 1.5");
+    const char* kind = "";
+    double perName = names.empty() ? 0.0 : PerItem(before, after, names.size(), kind);
+    std::printf("NOTE|P7 memory: %s per listed name while one result is held: %.0f B\n", kind, perName);
+}
+
+}  // namespace
+
+int main() {
+    WriteConfiguration();
+    Check(::CoInitializeEx(nullptr, COINIT_MULTITHREADED), "CoInitializeEx");
+    {
+        ComPtr<IInstrSessionMgr> manager;
+        Check(::CoCreateInstance(CLSID_InstrSessionMgr, nullptr, CLSCTX_INPROC_SERVER, IID_IInstrSessionMgr,
+                                 manager.PutVoid()),
+              "CoCreateInstance(InstrSessionMgr): is SessionMgr.dll registered in this prefix?");
+        LookupAndLateBinding(manager.Get());
+        MemoryPerSession(manager.Get());
+        ListNames(manager.Get());
+    }
+    ::CoUninitialize();
+    return 0;
+}
