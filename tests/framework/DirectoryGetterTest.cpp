@@ -68,32 +68,25 @@ TEST(InstalledLayout, ShellFoldersPlusProductFolders) {
     EXPECT_EQ(getter.GetPublicDirectory("2021", true).View(), getter.GetPublicDirectory().View());
 }
 
-TEST(InstalledLayout, NoEngineAndNoFrameworkModuleMeansNoInstallation) {
+TEST(InstalledLayout, InstallationIsThreeComponentsAboveTheLoadedFrameworkOrElseTheEngineModule) {
+    TableSystem none;
+    ExpectTE([&] { DirectoryGetter("2021", none).GetInstallationDirectory(); }, TE_OPERATION_FAILED,
+             "Verentis Engine not registered", "DirectoryGetter::GetActiveTEDirectoryFromRegistry");
+    const struct { const char *engine, *framework, *installation; } cases[] = {
+        {"D:\\Prod\\Verentis\\Bin\\x64\\Engine.dll", nullptr, "D:\\Prod\\Verentis\\"},
+        {"C:\\Engine\\Engine.dll", nullptr, "C:\\"},
+        {"D:\\Prod\\Verentis\\Bin\\x64\\Engine.dll", "E:\\Tree\\Verentis\\Bin\\x64\\Release\\vantrel.dll", "E:\\Tree\\Verentis\\"}};
+    for (const auto& c : cases) {
+        TableSystem system;
+        system.RegisterEngine(c.engine);
+        if (c.framework) system.framework = c.framework;
+        DirectoryGetter getter("2021", system);
+        EXPECT_EQ(getter.GetInstallationDirectory().View(), c.installation) << c.engine;
+        EXPECT_FALSE(getter.IsDevBuild());
+    }
     TableSystem system;
-    DirectoryGetter getter("2021", system);
-    ExpectTE([&] { getter.GetInstallationDirectory(); }, TE_OPERATION_FAILED, "Verentis Engine not registered",
-             "DirectoryGetter::GetActiveTEDirectoryFromRegistry");
-}
-
-TEST(InstalledLayout, InstallationIsThreeComponentsAboveTheEngineModule) {
-    TableSystem system;
-    system.RegisterEngine("D:\\Prod\\Verentis\\Bin\\x64\\Engine.dll");
-    DirectoryGetter getter("2021", system);
-    EXPECT_EQ(getter.GetInstallationDirectory().View(), "D:\\Prod\\Verentis\\");
-    EXPECT_FALSE(getter.IsDevBuild());
-    EXPECT_EQ(getter.GetProgramsDirectory().View(), "D:\\Prod\\Verentis\\Bin\\");
-
-    TableSystem shallow;
-    shallow.RegisterEngine("C:\\Engine\\Engine.dll");
-    EXPECT_EQ(DirectoryGetter("2021", shallow).GetInstallationDirectory().View(), "C:\\");
-}
-
-TEST(InstalledLayout, TheLoadedFrameworkModuleWinsOverTheRegistration) {
-    TableSystem system;
-    system.RegisterEngine("D:\\Prod\\Verentis\\Bin\\x64\\Engine.dll");
-    system.framework = "E:\\Tree\\Verentis\\Bin\\x64\\Release\\vantrel.dll";
-    DirectoryGetter getter("2021", system);
-    EXPECT_EQ(getter.GetInstallationDirectory().View(), "E:\\Tree\\Verentis\\");
+    system.RegisterEngine(cases[0].engine);
+    EXPECT_EQ(DirectoryGetter("2021", system).GetProgramsDirectory().View(), "D:\\Prod\\Verentis\\Bin\\");
 }
 
 TEST(DevelopmentLayout, TheBeaconMovesEveryDirectoryNextToTheInstallation) {

@@ -316,11 +316,10 @@ TEST(IniValues, PathsAreDecodedAndNeverCut) {
 }
 
 TEST(IniValues, EngineErrorsMapToTECodesAndMessages) {
-    EXPECT_EQ(IniErrorToTECode(InvalidBooleanValue), TE_INVALID_OR_OUT_OF_RANGE);
-    EXPECT_EQ(IniErrorToTECode(UnRecognizedValue), TE_UNRECOGNIZED_VALUE);
-    EXPECT_EQ(IniErrorToTECode(OperationInProgress), TE_OPERATION_IN_PROGRESS);
-    EXPECT_EQ(IniErrorToTECode(DiskFull), TE_DISK_FULL);
-    EXPECT_EQ(IniErrorToTECode(-4999), TE_OPERATION_FAILED);
+    for (auto [engine, code] : {std::pair<std::int32_t, std::int32_t>{InvalidBooleanValue, TE_INVALID_OR_OUT_OF_RANGE},
+                                {UnRecognizedValue, TE_UNRECOGNIZED_VALUE}, {OperationInProgress, TE_OPERATION_IN_PROGRESS},
+                                {DiskFull, TE_DISK_FULL}, {-4999, TE_OPERATION_FAILED}})
+        EXPECT_EQ(IniErrorToTECode(engine), code) << engine;
     EXPECT_EQ(GetIniErrorMessage(-4999), "No description available. ");
     ExpectTE([] { RaiseIniError("VxipnpInfo::Parse", InvalidBooleanValue); }, TE_INVALID_OR_OUT_OF_RANGE,
              "Invalid Boolean Value", "VxipnpInfo::Parse");

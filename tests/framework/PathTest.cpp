@@ -73,15 +73,10 @@ TEST(PathText, DriveCompletionAppendAndParent) {
     EXPECT_EQ(Path("C:\\dir").AppendDirectory("Cfg").View(), "C:\\dir\\Cfg\\");
     EXPECT_EQ(Path("C:\\dir\\").EnsureTrailingSeparator().View(), "C:\\dir\\");
 
-    EXPECT_EQ(Path("C:\\a\\b").Parent().View(), "C:\\a");
-    EXPECT_EQ(Path("C:\\a\\b\\").Parent().View(), "C:\\a");
-    EXPECT_EQ(Path("C:\\a").Parent().View(), "C:\\");
-    EXPECT_EQ(Path("C:\\").Parent().View(), "C:\\");
-    EXPECT_EQ(Path("\\\\srv\\share\\a\\b").Parent().View(), "\\\\srv\\share\\a");
-    EXPECT_EQ(Path("\\\\srv\\share\\a").Parent().View(), "\\\\srv\\share");
-    EXPECT_EQ(Path("\\\\srv\\share").Parent().View(), "\\\\srv\\share");
-    EXPECT_EQ(Path("dir\\file").Parent().View(), "dir");
-    EXPECT_EQ(Path("file").Parent().View(), "");
+    for (auto [path, parent] : {std::pair{"C:\\a\\b", "C:\\a"}, {"C:\\a\\b\\", "C:\\a"}, {"C:\\a", "C:\\"}, {"C:\\", "C:\\"},
+                                {"\\\\srv\\share\\a\\b", "\\\\srv\\share\\a"}, {"\\\\srv\\share\\a", "\\\\srv\\share"},
+                                {"\\\\srv\\share", "\\\\srv\\share"}, {"dir\\file", "dir"}, {"file", ""}})
+        EXPECT_EQ(Path(path).Parent().View(), parent) << path;
 
     EXPECT_TRUE(Path("C:").IsAbsolute());
     EXPECT_TRUE(Path("\\\\srv\\share").IsAbsolute());

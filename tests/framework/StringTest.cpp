@@ -149,7 +149,7 @@ TEST(StringEdits, TrimDeleteInsertReplace) {
     EXPECT_FALSE(replace.ReplaceFirst("three", "3", true));
 }
 
-TEST(StringReplaceArg, FillsFirstPlaceholderOnly) {
+TEST(StringReplaceArg, FillsFirstPlaceholderOnlyAndAMissingOneAppendsTheTail) {
     DynamicString message("The value '%1' is not a valid value.");
     message.ReplaceArg(1, "abc");
     EXPECT_STREQ(message.GetText(), "The value 'abc' is not a valid value.");
@@ -162,12 +162,10 @@ TEST(StringReplaceArg, FillsFirstPlaceholderOnly) {
     numbered.ReplaceArg(1, std::int64_t{-17402}, "%d");
     numbered.ReplaceArg(2, std::string_view("C:\\x"));
     EXPECT_STREQ(numbered.GetText(), "code -17402, path C:\\x");
-}
 
-TEST(StringReplaceArg, MissingPlaceholderAppendsTheTail) {
-    DynamicString message("No placeholder here");
-    message.ReplaceArg(2, "x");
-    EXPECT_STREQ(message.GetText(), "No placeholder here COULD NOT FIND %2TO REPLACE WITH x ");
+    DynamicString missing("No placeholder here");
+    missing.ReplaceArg(2, "x");
+    EXPECT_STREQ(missing.GetText(), "No placeholder here COULD NOT FIND %2TO REPLACE WITH x ");
 }
 
 TEST(StringNumbers, FullSixtyFourBitValues) {

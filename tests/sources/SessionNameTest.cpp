@@ -32,47 +32,29 @@ const std::string trailBackslash = "\x83\x5C";
 
 TEST(CategorySeparator, EveryFormHasItsLength) {
     const struct {
-        const char* separator;
-        std::size_t length;
-    } forms[] = {
-        {":", 1},      {"::", 2},    {":\\", 2}, {":/", 2},   {":\\\\", 3}, {"://", 3},   {":/\\", 3},
-        {":\\/", 3},   {"/", 1},     {"//", 2},  {"/\\", 2},  {"\\", 1},    {"\\\\", 2}, {"\\/", 2},
+        const char* text;
+        std::size_t position, length;
+    } cases[] = {
+        {"VISA:GPIB0", 4, 1},    {"VISA::GPIB0", 4, 2},   {"VISA:\\GPIB0", 4, 2},  {"VISA:/GPIB0", 4, 2},
+        {"VISA:\\\\GPIB0", 4, 3}, {"VISA://GPIB0", 4, 3},  {"VISA:/\\GPIB0", 4, 3}, {"VISA:\\/GPIB0", 4, 3},
+        {"VISA/GPIB0", 4, 1},    {"VISA//GPIB0", 4, 2},   {"VISA/\\GPIB0", 4, 2},  {"VISA\\GPIB0", 4, 1},
+        {"VISA\\\\GPIB0", 4, 2}, {"VISA\\/GPIB0", 4, 2},
+        // Only the characters after the first one count; longer runs are cut at the longest form.
+        {"A:::B", 1, 2}, {"A///B", 1, 2}, {"A:\\\\\\B", 1, 3},
+        // A slash or backslash run never absorbs a colon.
+        {"A/:B", 1, 1}, {"A\\:B", 1, 1},
+        // The first separator character wins over a longer form later in the text.
+        {"GPIB0::3/x", 5, 2}, {"A/B::C", 1, 1},
+        // At the edges.
+        {"::DMM1", 0, 2}, {"CUSTOM:", 6, 1}, {"CUSTOM::", 6, 2}, {"CUSTOM:/\\", 6, 3},
     };
-    for (const auto& form : forms) {
-        Separator found = SeparatorOf(std::string("VISA") + form.separator + "GPIB0");
-        EXPECT_EQ(found.position, 4u) << "separator " << form.separator;
-        EXPECT_EQ(found.length, form.length) << "separator " << form.separator;
+    for (const auto& c : cases) {
+        Separator found = SeparatorOf(c.text);
+        EXPECT_EQ(found.position, c.position) << c.text;
+        EXPECT_EQ(found.length, c.length) << c.text;
     }
-}
-
-TEST(CategorySeparator, LengthIsDecidedAtTheFirstSeparatorCharacter) {
-    // Only the characters after the first one count; longer runs are cut at the longest form.
-    EXPECT_EQ(SeparatorOf("A:::B").length, 2u);
-    EXPECT_EQ(SeparatorOf("A///B").length, 2u);
-    EXPECT_EQ(SeparatorOf("A:\\\\\\B").length, 3u);
-    // A slash or backslash run never absorbs a colon.
-    EXPECT_EQ(SeparatorOf("A/:B").length, 1u);
-    EXPECT_EQ(SeparatorOf("A\\:B").length, 1u);
-    // The first separator character wins over a longer form later in the text.
-    Separator first = SeparatorOf("GPIB0::3/x");
-    EXPECT_EQ(first.position, 5u);
-    EXPECT_EQ(first.length, 2u);
-    Separator slashFirst = SeparatorOf("A/B::C");
-    EXPECT_EQ(slashFirst.position, 1u);
-    EXPECT_EQ(slashFirst.length, 1u);
-}
-
-TEST(CategorySeparator, AtTheEdgesAbsentInPlainNamesAndEmptyText) {
-    EXPECT_EQ(SeparatorOf("::DMM1").position, 0u);
-    EXPECT_EQ(SeparatorOf("::DMM1").length, 2u);
-    EXPECT_EQ(SeparatorOf("CUSTOM:").position, 6u);
-    EXPECT_EQ(SeparatorOf("CUSTOM:").length, 1u);
-    EXPECT_EQ(SeparatorOf("CUSTOM::").length, 2u);
-    EXPECT_EQ(SeparatorOf("CUSTOM:/\\").length, 3u);
     std::size_t position = 7, length = 7;
-    EXPECT_FALSE(FindCategorySeparator("", &position, &length));
-    EXPECT_FALSE(FindCategorySeparator("DMM1", &position, &length));
-    EXPECT_FALSE(FindCategorySeparator("a.b-c_d*e|f", &position, &length));
+    for (const char* plain : {"", "DMM1", "a.b-c_d*e|f"}) EXPECT_FALSE(FindCategorySeparator(plain, &position, &length)) << plain;
     // Outputs are optional.
     EXPECT_TRUE(FindCategorySeparator("IVI/DMM1", nullptr, nullptr));
 }
