@@ -115,6 +115,13 @@ void Categories(const CommandLine& line, std::ostream& out) {
     PrintList(line, out, "categories", BstrArray(categories.array));
 }
 
+// "*VISA::GPIB0::14::INSTR": a session of the shared process names itself "*GPIB0::14::INSTR"; the
+// star leads the whole name, so the line can be passed back to the tool as it stands.
+std::string QualifiedName(const std::string& category, const std::string& name) {
+    if (!name.empty() && name[0] == '*') return "*" + category + "::" + name.substr(1);
+    return category + "::" + name;
+}
+
 void Sessions(const CommandLine& line, std::ostream& out) {
     SafeArrayOwner sessions;
     Check(Manager()->GetSessions(Bstr(Positional(line)).Get(), &sessions.array));
@@ -133,7 +140,7 @@ void Sessions(const CommandLine& line, std::ostream& out) {
         rows.push_back(line.json ? JsonObject({{"category", JsonString(category)},
                                                {"name", JsonString(name)},
                                                {"lock", LockJson(lock)}})
-                                 : category + "::" + name + "  (" + LockText(lock) + ")");
+                                 : QualifiedName(category, name) + "  (" + LockText(lock) + ")");
     }
     if (line.json) {
         std::string json = "{\"sessions\":[";
