@@ -3,6 +3,7 @@
 
 #include "ComTestSupport.h"
 
+#include <string>
 #include <vector>
 #include "com/Interfaces.h"
 
@@ -60,6 +61,12 @@ public:
         for (VARIANT& value : values) ::VariantClear(&value);
     }
     Arguments& Text(const wchar_t* text) { return Add(VT_BSTR).bstrVal = ::SysAllocString(text), *this; }
+    // Any UTF-16, embedded NULs included.
+    Arguments& Text(const std::wstring& text) {
+        return Add(VT_BSTR).bstrVal = ::SysAllocStringLen(text.data(), static_cast<UINT>(text.size())), *this;
+    }
+    // An argument of that type with no value (VT_NULL, VT_UNKNOWN with a null pointer, ...).
+    Arguments& Null(VARTYPE type) { return Add(type), *this; }
     Arguments& Long(LONG number) { return Add(VT_I4).lVal = number, *this; }
     Arguments& Double(double number) { return Add(VT_R8).dblVal = number, *this; }
     Arguments& Bool(bool flag) { return Add(VT_BOOL).boolVal = flag ? VARIANT_TRUE : VARIANT_FALSE, *this; }

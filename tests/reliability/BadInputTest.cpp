@@ -48,31 +48,6 @@ UniqueBstr Wide(const std::wstring& text) {
     return UniqueBstr(::SysAllocStringLen(text.data(), static_cast<UINT>(text.size())));
 }
 
-// IDispatch arguments in the caller's order; the VARIANTs are owned here.
-class Arguments {
-public:
-    Arguments() = default;
-    Arguments(const Arguments&) = delete;
-    ~Arguments() {
-        for (VARIANT& value : values) ::VariantClear(&value);
-    }
-    Arguments&& Text(const std::wstring& text) && { Add(VT_BSTR).bstrVal = Wide(text).Release(); return std::move(*this); }
-    Arguments&& Long(LONG number) && { Add(VT_I4).lVal = number; return std::move(*this); }
-    Arguments&& Real(double number) && { Add(VT_R8).dblVal = number; return std::move(*this); }
-    Arguments&& Bool(bool flag) && { Add(VT_BOOL).boolVal = flag ? VARIANT_TRUE : VARIANT_FALSE; return std::move(*this); }
-    Arguments&& Null(VARTYPE type) && { Add(type); return std::move(*this); }
-    std::vector<VARIANT> Reversed() const { return {values.rbegin(), values.rend()}; }
-
-private:
-    VARIANT& Add(VARTYPE type) {
-        values.emplace_back();
-        ::VariantInit(&values.back());
-        values.back().vt = type;
-        return values.back();
-    }
-    std::vector<VARIANT> values;
-};
-
 Outcome Late(IDispatch* target, DISPID member, WORD flags, const Arguments& arguments, VARIANT* result = nullptr) {
     std::vector<VARIANT> reversed = arguments.Reversed();
     DISPID named = DISPID_PROPERTYPUT;
