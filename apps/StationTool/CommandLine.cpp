@@ -20,8 +20,8 @@ std::string CommandLine::Value(const std::string& option, const std::string& fal
     return found == values.end() ? fallback : found->second;
 }
 
-const std::vector<CommandSpec>& Commands() {
-    static const std::vector<CommandSpec> commands = {
+const std::vector<CommandSyntax>& Commands() {
+    static const std::vector<CommandSyntax> commands = {
         {"list", "list [CATEGORY] [--hidden] [--filter SpecificPrefix=x]",
          "names that can be opened, with their category prefixes", 0, 1, {"--filter"}, {"--hidden"}},
         {"categories", "categories [CATEGORY]", "the visible categories (and sub-categories)", 0, 1, {}, {}},
@@ -42,9 +42,9 @@ const std::vector<CommandSpec>& Commands() {
     return commands;
 }
 
-const CommandSpec* FindCommand(const std::string& name) {
-    for (const CommandSpec& spec : Commands())
-        if (name == spec.name) return &spec;
+const CommandSyntax* FindCommand(const std::string& name) {
+    for (const CommandSyntax& syntax : Commands())
+        if (name == syntax.name) return &syntax;
     return nullptr;
 }
 
@@ -56,8 +56,8 @@ std::optional<CommandLine> ParseCommandLine(const std::vector<std::string>& argu
         return line;
     }
     line.command = arguments[0];
-    const CommandSpec* spec = FindCommand(line.command);
-    if (!spec) {
+    const CommandSyntax* syntax = FindCommand(line.command);
+    if (!syntax) {
         error = "unknown command '" + line.command + "'";
         return std::nullopt;
     }
@@ -67,13 +67,13 @@ std::optional<CommandLine> ParseCommandLine(const std::vector<std::string>& argu
             line.json = true;
         } else if (argument == "--help" || argument == "-h") {
             line.help = true;
-        } else if (Contains(spec->valueOptions, argument)) {
+        } else if (Contains(syntax->valueOptions, argument)) {
             if (i + 1 >= arguments.size()) {
                 error = "option " + argument + " needs a value";
                 return std::nullopt;
             }
             line.values[argument] = arguments[++i];
-        } else if (Contains(spec->flagOptions, argument)) {
+        } else if (Contains(syntax->flagOptions, argument)) {
             line.flags.push_back(argument);
         } else if (argument.size() > 2 && argument.compare(0, 2, "--") == 0) {
             error = "unknown option " + argument + " for '" + line.command + "'";
@@ -84,8 +84,8 @@ std::optional<CommandLine> ParseCommandLine(const std::vector<std::string>& argu
     }
     if (line.help) return line;
     int count = static_cast<int>(line.positional.size());
-    if (count < spec->minPositional || count > spec->maxPositional) {
-        error = "usage: sessionmgr " + std::string(spec->usage);
+    if (count < syntax->minPositional || count > syntax->maxPositional) {
+        error = "usage: sessionmgr " + std::string(syntax->usage);
         return std::nullopt;
     }
     if (line.command == "lock" && line.Value("--key").empty()) {
@@ -97,8 +97,8 @@ std::optional<CommandLine> ParseCommandLine(const std::vector<std::string>& argu
 
 std::string GeneralHelp() {
     std::string text = "sessionmgr: what the session manager of this station sees.\n\nCommands:\n";
-    for (const CommandSpec& spec : Commands())
-        text += "  " + std::string(spec.usage) + "\n      " + spec.summary + "\n";
+    for (const CommandSyntax& syntax : Commands())
+        text += "  " + std::string(syntax.usage) + "\n      " + syntax.summary + "\n";
     text +=
         "\nEvery command takes --json (machine-readable output) and --help.\n"
         "Exit status: 0 on success, 1 when the session manager reports an error (its code and message go to\n"
@@ -106,8 +106,8 @@ std::string GeneralHelp() {
     return text;
 }
 
-std::string CommandHelp(const CommandSpec& spec) {
-    return "usage: sessionmgr " + std::string(spec.usage) + " [--json]\n  " + spec.summary + "\n";
+std::string CommandHelp(const CommandSyntax& syntax) {
+    return "usage: sessionmgr " + std::string(syntax.usage) + " [--json]\n  " + syntax.summary + "\n";
 }
 
 }  // namespace station

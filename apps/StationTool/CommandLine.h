@@ -9,7 +9,7 @@
 
 namespace station {
 
-struct CommandSpec {
+struct CommandSyntax {
     const char* name;
     const char* usage;        // "open NAME [--options TEXT]"
     const char* summary;      // one line for the general help
@@ -32,8 +32,8 @@ struct CommandLine {
 };
 
 // Every command the tool knows, in the order the general help lists them.
-const std::vector<CommandSpec>& Commands();
-const CommandSpec* FindCommand(const std::string& name);
+const std::vector<CommandSyntax>& Commands();
+const CommandSyntax* FindCommand(const std::string& name);
 
 // Parses the arguments after the program name. "--json" and "--help" are accepted everywhere; an
 // empty argument list or "help" asks for the general help. On a usage error returns nothing and
@@ -41,6 +41,6 @@ const CommandSpec* FindCommand(const std::string& name);
 std::optional<CommandLine> ParseCommandLine(const std::vector<std::string>& arguments, std::string& error);
 
 std::string GeneralHelp();
-std::string CommandHelp(const CommandSpec& spec);
+std::string CommandHelp(const CommandSyntax& syntax);
 
 }  // namespace station

@@ -45,8 +45,8 @@ int main(int argc, char** argv) {
         return 2;
     }
     if (line->help) {
-        const station::CommandSpec* spec = station::FindCommand(line->command);
-        std::cout << (spec ? station::CommandHelp(*spec) : station::GeneralHelp());
+        const station::CommandSyntax* syntax = station::FindCommand(line->command);
+        std::cout << (syntax ? station::CommandHelp(*syntax) : station::GeneralHelp());
         return 0;
     }
     Apartment apartment;

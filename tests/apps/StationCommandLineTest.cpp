@@ -42,11 +42,11 @@ TEST(StationCommandLine, RefusesWhatItDoesNotUnderstand) {
 }
 
 TEST(StationCommandLine, HelpIsAnsweredForEveryCommandWithoutItsArguments) {
-    for (const CommandSpec& spec : Commands()) {
-        auto line = Parse({spec.name, "--help"});
-        ASSERT_TRUE(line) << spec.name;
+    for (const CommandSyntax& syntax : Commands()) {
+        auto line = Parse({syntax.name, "--help"});
+        ASSERT_TRUE(line) << syntax.name;
         EXPECT_TRUE(line->help);
-        EXPECT_NE(CommandHelp(spec).find(spec.usage), std::string::npos);
+        EXPECT_NE(CommandHelp(syntax).find(syntax.usage), std::string::npos);
     }
     EXPECT_TRUE(Parse({})->help);
 }
