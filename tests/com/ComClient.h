@@ -42,6 +42,23 @@ inline std::string CategoryOf(IInstrSession* session) {
     return Text(category.Get());
 }
 
+// GetNames and GetCategories as texts; fail the test on an error.
+inline std::vector<std::string> ListNames(IInstrSessionMgr* manager, const wchar_t* category, LONG options,
+                                          const wchar_t* filter = L"") {
+    UniqueSafeArray names;
+    EXPECT_EQ(manager->GetNames(Bstr(category).Get(), static_cast<GetNamesOptions>(options), Bstr(filter).Get(),
+                                names.Put()),
+              S_OK)
+        << TakeErrorInfo().description;
+    return ReadTexts(names.Get());
+}
+
+inline std::vector<std::string> ListCategories(IInstrSessionMgr* manager, const wchar_t* baseCategory) {
+    UniqueSafeArray categories;
+    EXPECT_EQ(manager->GetCategories(Bstr(baseCategory).Get(), categories.Put()), S_OK) << TakeErrorInfo().description;
+    return ReadTexts(categories.Get());
+}
+
 // Identity of a COM object: its IUnknown pointer.
 template <class Interface>
 IUnknown* IdentityOf(Interface* object) {

@@ -5,7 +5,8 @@
 //
 // Hiding renames the installed library in the prefix's system directory for the first case only;
 // ctest runs this program under the lock that every COM test holds, so no other test sees it gone.
-#include "IviSupport.h"
+#include "SimBench.h"
+#include "com/ComClient.h"
 
 using namespace sm;
 using namespace sm::testing;
@@ -13,21 +14,8 @@ using namespace sm::testing;
 namespace {
 const ::testing::Environment* const apartment = ::testing::AddGlobalTestEnvironment(new MultithreadedApartment);
 
-std::string SystemLibrary() {
-    char system[MAX_PATH] = {};
-    ::GetSystemDirectoryA(system, MAX_PATH);
-    return std::string(system) + "\\iviconfig.dll";
-}
-
-// Renames the library out of the way for its lifetime.
-class HiddenLibrary {
-public:
-    HiddenLibrary() : moved(::MoveFileA(SystemLibrary().c_str(), (SystemLibrary() + ".hidden").c_str()) != 0) {}
-    ~HiddenLibrary() {
-        if (moved) ::MoveFileA((SystemLibrary() + ".hidden").c_str(), SystemLibrary().c_str());
-    }
-    const bool moved;
-};
+using Texts = std::vector<std::string>;
+void WriteSetup(const std::string& store) { UseSimSetup("iviinstallation", store); }
 
 // The older library: the stand-in drops the class-count function when it is loaded.
 std::string Store(const std::string& switches = "") {
@@ -43,13 +31,13 @@ std::string Store(const std::string& switches = "") {
 TEST(IviInstallation, WithoutTheLibraryEveryIviListingFailsNamingItsPath) {
     WriteSetup(Store());
     auto manager = CreateManager();
-    HiddenLibrary hidden;
-    ASSERT_TRUE(hidden.moved) << "is the IVI stand-in installed (sm_install_sim)?";
+    LibraryHidden hidden("iviconfig.dll");
+    ASSERT_TRUE(hidden.hidden) << "is the IVI stand-in installed (sm_install_sim)?";
     auto all = Bstr(L""), ivi = Bstr(L"IVI");
     UniqueSafeArray names;
     EXPECT_EQ(static_cast<unsigned long>(manager->GetNames(all.Get(), ReturnVirtualInstruments, all.Get(), names.Put())),
               0xFFFFBD94);
-    EXPECT_EQ(TakeErrorInfo().description.rfind("Could not load DLL or external library '" + SystemLibrary() +
+    EXPECT_EQ(TakeErrorInfo().description.rfind("Could not load DLL or external library '" + hidden.path +
                                                     "'.\nWin32 Error Code = '126'\n",
                                                 0),
               0u);
@@ -66,12 +54,12 @@ TEST(IviInstallation, AStoreThatCannotBeOpenedIsReportedAndTriedAgain) {
               "The Quillvane Dovekit may not be installed. The installer for the Dovekit is located on the Quillvane "
               "Driver CD-ROM.\n");
     WriteSetup(Store());
-    EXPECT_EQ(List(manager.Get(), L"IVI"), (Texts{"IviDmm", "IviScope"}));
+    EXPECT_EQ(ListCategories(manager.Get(), L"IVI"), (Texts{"IviDmm", "IviScope"}));
 }
 
 TEST(IviInstallation, WithoutClassCountFunctionsEachInstrumentHasItsOneClass) {
     auto manager = CreateManager();
     // Multi's driver names no single class: its names carry an empty class before the manager's prefix.
-    EXPECT_EQ(List(manager.Get(), L"IVI", ReturnVirtualInstruments | IncludeCategoryPrefix),
+    EXPECT_EQ(ListNames(manager.Get(), L"IVI", ReturnVirtualInstruments | IncludeCategoryPrefix),
               (Texts{"IVI::IviDmm::DMM1", "IVI::::Multi", "IVI::IviScope::Bare"}));
 }

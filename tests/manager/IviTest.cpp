@@ -1,10 +1,12 @@
 // IVI names and sessions through real COM, over the stand-in IVI configuration library and IVI-C
 // drivers installed in the prefix. The store is this program's own setup file; the configuration
 // file with the init defaults lives in a VXIplug&play directory of its own.
-#include "IviSupport.h"
+#include "SimBench.h"
+#include "com/ComClient.h"
 
 using namespace sm;
 using namespace sm::testing;
+using Texts = std::vector<std::string>;
 
 namespace {
 const ::testing::Environment* const apartment = ::testing::AddGlobalTestEnvironment(new MultithreadedApartment);
@@ -32,16 +34,11 @@ std::string Store(int changeCount, const std::string& drivers = "", const std::s
            "[IVI LogicalNames]\nMyDmm = dmm1\nBench = DMM1\n" + drivers;
 }
 
+void WriteSetup(const std::string& store) { UseSimSetup("ivibench", store); }
+
 const bool benchWritten = [] {
     WriteSetup(Store(1));
-    char temp[MAX_PATH] = {};
-    ::GetTempPathA(MAX_PATH, temp);
-    std::string root = std::string(temp) + "SessionMgrIviTest";
-    ::CreateDirectoryA(root.c_str(), nullptr);
-    ::CreateDirectoryA((root + "\\Win64").c_str(), nullptr);
-    std::ofstream(root + "\\Win64\\QVSessionMgr.ini", std::ios::trunc)
-        << "[VInstr->DMM1]\nIDQuery = 0\n[VInstr->IviSwtch::Multi]\nReset = False\n";
-    ::SetEnvironmentVariableA("VXIPNPPATH", root.c_str());
+    UseConfigurationFile("SessionMgrIviTest", "[VInstr->DMM1]\nIDQuery = 0\n[VInstr->IviSwtch::Multi]\nReset = False\n");
     return true;
 }();
 
@@ -63,34 +60,34 @@ protected:
 }  // namespace
 
 TEST_F(Ivi, NamesByOptionClassPrefixSubCategoryAndFilter) {
-    EXPECT_EQ(List(manager.Get(), L"IVI", logicalAndVirtual),
+    EXPECT_EQ(ListNames(manager.Get(), L"IVI", logicalAndVirtual),
               (Texts{"DMM1", "MyDmm", "Bench", "Gen1", "Multi", "Multi", "Meter2"}));
-    EXPECT_EQ(List(manager.Get(), L"IVI", ReturnLogicalNames), (Texts{"MyDmm", "Bench"}));
-    EXPECT_EQ(List(manager.Get(), L"IVI::IviDmm", ReturnVirtualInstruments | ReturnHiddenNames),
+    EXPECT_EQ(ListNames(manager.Get(), L"IVI", ReturnLogicalNames), (Texts{"MyDmm", "Bench"}));
+    EXPECT_EQ(ListNames(manager.Get(), L"IVI::IviDmm", ReturnVirtualInstruments | ReturnHiddenNames),
               (Texts{"DMM1", "VInstr->DMM1", "Multi", "VInstr->Multi", "Meter2", "VInstr->Meter2"}));
-    EXPECT_EQ(List(manager.Get(), L"IVI::IviFgen", logicalAndVirtual | IncludeCategoryPrefix),
+    EXPECT_EQ(ListNames(manager.Get(), L"IVI::IviFgen", logicalAndVirtual | IncludeCategoryPrefix),
               (Texts{"IVI::IviFgen::Gen1"}));
-    EXPECT_EQ(List(manager.Get(), L"IVI", ReturnVirtualInstruments, L"SpecificPrefix = AG34401"), Texts{"Meter2"});
-    EXPECT_EQ(List(manager.Get(), L"IVI", logicalAndVirtual, L"Foo=1"), Texts{});
+    EXPECT_EQ(ListNames(manager.Get(), L"IVI", ReturnVirtualInstruments, L"SpecificPrefix = AG34401"), Texts{"Meter2"});
+    EXPECT_EQ(ListNames(manager.Get(), L"IVI", logicalAndVirtual, L"Foo=1"), Texts{});
     // Repeated classes give one entry each; an instrument without a class is nowhere.
-    EXPECT_EQ(List(manager.Get(), L"IVI"), (Texts{"IviDmm", "IviFgen", "IviSwtch"}));
-    EXPECT_EQ(List(manager.Get(), L"IVI::IviDmm"), Texts{});
+    EXPECT_EQ(ListCategories(manager.Get(), L"IVI"), (Texts{"IviDmm", "IviFgen", "IviSwtch"}));
+    EXPECT_EQ(ListCategories(manager.Get(), L"IVI::IviDmm"), Texts{});
     auto bare = Bstr(L"IVI::Bare");
     ComPtr<IInstrSession> none;
     EXPECT_EQ(static_cast<unsigned long>(manager->GetInstrSession(bare.Get(), VARIANT_FALSE, none.Put())), 0xFFFFBC68);
 }
 
 TEST_F(Ivi, StoreIsReadOnceUntilItsChangeCountMoves) {
-    List(manager.Get(), L"IVI", logicalAndVirtual);
+    ListNames(manager.Get(), L"IVI", logicalAndVirtual);
     long reads = SimCount("iviconfig.dll", "IviIni_GetNumberOfVIs");
-    List(manager.Get(), L"IVI", logicalAndVirtual);
-    List(manager.Get(), L"IVI");
+    ListNames(manager.Get(), L"IVI", logicalAndVirtual);
+    ListCategories(manager.Get(), L"IVI");
     EXPECT_EQ(SimCount("iviconfig.dll", "IviIni_GetNumberOfVIs"), reads);
     WriteSetup(Store(2, "", "[IVI Instrument Late]\nDriverSession = SimGen\n"));
-    EXPECT_EQ(List(manager.Get(), L"IVI::IviFgen", ReturnVirtualInstruments), (Texts{"Gen1", "Late"}));
+    EXPECT_EQ(ListNames(manager.Get(), L"IVI::IviFgen", ReturnVirtualInstruments), (Texts{"Gen1", "Late"}));
     EXPECT_EQ(SimCount("iviconfig.dll", "IviIni_GetNumberOfVIs"), reads + 1);
     WriteSetup(Store(3));
-    EXPECT_EQ(List(manager.Get(), L"IVI::IviFgen", ReturnVirtualInstruments), (Texts{"Gen1"}));
+    EXPECT_EQ(ListNames(manager.Get(), L"IVI::IviFgen", ReturnVirtualInstruments), (Texts{"Gen1"}));
 }
 
 TEST_F(Ivi, SessionAnswersToEveryNameOfItsInstrumentAndCarriesItsClass) {
