@@ -2,7 +2,6 @@
 // session, close order, the errors of viOpen, and the manager's VISA listing.
 #include <gtest/gtest.h>
 
-
 #include "SimBench.h"
 #include "com/ComClient.h"
 #include "framework/ErrorCodes.h"
@@ -15,7 +14,7 @@ const ::testing::Environment* const apartment = ::testing::AddGlobalTestEnvironm
 
 const bool benchReady = [] {
     UseConfigurationFile("SessionMgrVisaSession", "[VISA Logical Names]\nDMM = GPIB0::14::INSTR\n");
-    UseSimSetup("SessionMgrVisaSession.ini", "[VISA GPIB0::14::INSTR]\n[VISA ASRL9::INSTR]\nOpenStatus = 0xBFFF0011\n"
+    UseSimSetup("visasession", "[VISA GPIB0::14::INSTR]\n[VISA ASRL9::INSTR]\nOpenStatus = 0xBFFF0011\n"
                                              "[VISA ASRL8::INSTR]\nOpenStatus = 0x3FFF007D\n");
     return true;
 }();
@@ -32,13 +31,9 @@ struct VisaSession : ::testing::Test {
 // Catches a second viOpen for a second module, a handle of the wrong type, driver levels that open,
 // and VISA names missing from the manager's listing and state description.
 TEST_F(VisaSession, ModulesShareOneHandleOpenedOnce) {
-    auto category = Bstr(L"VISA"), filter = Bstr(L"");
-    UniqueSafeArray names;
-    ASSERT_EQ(manager->GetNames(category.Get(), static_cast<GetNamesOptions>(3 | 8), filter.Get(), names.Put()), S_OK);
-    LONG index = 1;
-    UniqueBstr listed, state;
-    ::SafeArrayGetElement(names.Get(), &index, listed.Put());
-    EXPECT_EQ(Text(listed.Get()), "VISA::DMM");
+    auto names = ListNames(manager.Get(), L"VISA", ReturnLogicalNames | IncludeCategoryPrefix);
+    EXPECT_EQ(names, std::vector<std::string>{"VISA::DMM"});
+    UniqueBstr state;
     ASSERT_EQ(manager->get_StateDescription(state.Put()), S_OK);
     EXPECT_NE(Text(state.Get()).find("VISA Configuration:\n   Number of resources = 3\n"), std::string::npos);
     auto first = GetSession(manager.Get(), L"visa::DMM"), second = GetSession(manager.Get(), L"VISA::dmm");

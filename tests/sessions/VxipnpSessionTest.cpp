@@ -3,9 +3,9 @@
 // LoadLibrary) so that its counters survive the product freeing it.
 #include <gtest/gtest.h>
 
-#include <fstream>
 #include <string>
 
+#include "SimBench.h"
 #include "com/ComClient.h"
 #include "com/LibraryBinding.h"
 
@@ -21,34 +21,30 @@ std::string Escaped(std::string path) {
 }
 
 const std::string bin = [] {
-    char temp[MAX_PATH];
-    ::GetTempPathA(MAX_PATH, temp);
-    std::string root = std::string(temp) + "SessionMgrVxipnpSession";
-    for (const char* folder : {"", "\\Win64", "\\Win64\\Bin"}) ::CreateDirectoryA((root + folder).c_str(), nullptr);
-    std::string bin = root + "\\Win64\\Bin";
-    for (const char* driver : {SIM_SIMDMM, SIM_SIMNOCLOSE, SIM_SIMNOVPP}) {
-        std::string name(driver);
-        ::CopyFileA(driver, (bin + "\\" + name.substr(name.find_last_of("/\\") + 1)).c_str(), FALSE);
-    }
+    std::string bin = TempPath("SessionMgrVxipnpSession\\Win64\\Bin");
     auto instrument = [&](const char* name, const char* prefix, const char* resource) {
         return std::string("[VPPVInstr->") + name + "]\nModulePath = \"" + Escaped(bin + "\\" + prefix + "_64.dll") +
                "\"\nPrefix = \"" + prefix + "\"\nResource = \"" + resource + "\"\nIDQuery = True\nReset = False\n";
     };
-    std::ofstream(root + "\\Win64\\QVSessionMgr.ini", std::ios::trunc)
-        << "[VXIPNP Logical Names]\nDMM1 = \"VPPVInstr->BenchDMM\"\n"
-        << instrument("BenchDMM", "simdmm", "GPIB0::14::INSTR") << instrument("WarnDMM", "simdmm", "GPIB0::15::INSTR")
-        << instrument("AbsentDMM", "simdmm", "GPIB0::99::INSTR") << instrument("NoClose", "simnoclose", "GPIB0::14::INSTR")
-        << instrument("NoVpp", "simnovpp", "GPIB0::14::INSTR") << instrument("Missing", "absent", "GPIB0::14::INSTR");
-    std::ofstream(root + "\\simsetup.ini", std::ios::trunc)
-        << "[VXIPNP Resource GPIB0::14::INSTR]\nSession = 0x1401\n"
-           "[VXIPNP Resource GPIB0::15::INSTR]\nInitStatus = 0x3FFC0101\nSession = 0x1501\n"
-           "[VXIPNP Resource GPIB0::99::INSTR]\nInitStatus = 0xBFFF0011\n"
-           "[VXIPNP Driver simdmm]\nDriverRevision = drv 1.2\nFirmwareRevision = fw 7\nSelfTestResult = -3\n"
-           "SelfTestMessage = Input relay stuck\nSelfTestStatus = 0xBFFC0800\nErrorQueryCode = -113\n"
-           "ErrorQueryMessage = Undefined header\nErrorQueryStatus = -5\nResetStatus = 0x3FFC0101\n"
-           "Message -7 = Seven\n";
-    ::SetEnvironmentVariableA("VXIPNPPATH", root.c_str());
-    ::SetEnvironmentVariableA("SM_SIM_SETUP", (root + "\\simsetup.ini").c_str());
+    UseConfigurationFile("SessionMgrVxipnpSession",
+                         "[VXIPNP Logical Names]\nDMM1 = \"VPPVInstr->BenchDMM\"\n" +
+                             instrument("BenchDMM", "simdmm", "GPIB0::14::INSTR") +
+                             instrument("WarnDMM", "simdmm", "GPIB0::15::INSTR") +
+                             instrument("AbsentDMM", "simdmm", "GPIB0::99::INSTR") +
+                             instrument("NoClose", "simnoclose", "GPIB0::14::INSTR") +
+                             instrument("NoVpp", "simnovpp", "GPIB0::14::INSTR") +
+                             instrument("Missing", "absent", "GPIB0::14::INSTR"));
+    ::CreateDirectoryA(bin.c_str(), nullptr);
+    for (std::string driver : {SIM_SIMDMM, SIM_SIMNOCLOSE, SIM_SIMNOVPP})
+        ::CopyFileA(driver.c_str(), (bin + "\\" + driver.substr(driver.find_last_of("/\\") + 1)).c_str(), FALSE);
+    UseSimSetup("vxipnpsession",
+                "[VXIPNP Resource GPIB0::14::INSTR]\nSession = 0x1401\n"
+                "[VXIPNP Resource GPIB0::15::INSTR]\nInitStatus = 0x3FFC0101\nSession = 0x1501\n"
+                "[VXIPNP Resource GPIB0::99::INSTR]\nInitStatus = 0xBFFF0011\n"
+                "[VXIPNP Driver simdmm]\nDriverRevision = drv 1.2\nFirmwareRevision = fw 7\nSelfTestResult = -3\n"
+                "SelfTestMessage = Input relay stuck\nSelfTestStatus = 0xBFFC0800\nErrorQueryCode = -113\n"
+                "ErrorQueryMessage = Undefined header\nErrorQueryStatus = -5\nResetStatus = 0x3FFC0101\n"
+                "Message -7 = Seven\n");
     return bin;
 }();
 const std::string simdmmPath = bin + "\\simdmm_64.dll";
@@ -69,13 +65,8 @@ protected:
         EXPECT_EQ(session->get_StateDescription(text.Put()), S_OK);
         return Text(text.Get());
     }
-    // A failure with this HRESULT, this description and the session class's CLSID.
-    static void ExpectError(HRESULT result, unsigned long code, const std::string& description,
-                            const CLSID& classId = CLSID_VXIPNPInstrSession) {
-        EXPECT_EQ(static_cast<unsigned long>(result), code);
-        auto reported = TakeErrorInfo();
-        EXPECT_EQ(reported.description, description);
-        EXPECT_TRUE(IsEqualGUID(reported.guid, classId));
+    static void ExpectError(HRESULT result, unsigned long code, const std::string& description) {
+        ExpectComError(result, code, description, CLSID_VXIPNPInstrSession);
     }
     UniqueModule pinned;
     ComPtr<IInstrSessionMgr> manager;
