@@ -39,6 +39,11 @@ sm_start_wine() {
   if [ ! -f "$WINEPREFIX/system.reg" ]; then
     echo "== creating Wine prefix $WINEPREFIX =="
     timeout 300 wine wineboot -i >/dev/null 2>&1 || true
+    # The wineserver that ran the first-time setup keeps a second service manager and no RPC
+    # service; a local COM server started under it never reaches its clients. A fresh wineserver
+    # starts with one of each.
+    wineserver -k 2>/dev/null || true
+    wineserver -w 2>/dev/null || true
   fi
   wineserver -p </dev/null >/dev/null 2>&1 || true
   timeout 120 wine cmd /c exit >/dev/null 2>&1 || true
@@ -128,14 +133,3 @@ sm_register_external_server() {
   fi
 }
 
-# The first activation of the external-process server in a fresh prefix has been seen to fail and to
-# leave a server instance that never serves, so that later clients time out. One throw-away request
-# with the DLL registered, then a fresh wineserver (which ends every Wine process of the prefix),
-# leaves the prefix in the state in which activations are reliable.
-sm_warm_external_server() {
-  local log="$SM_WINDOWS_BUILD/external-server-warmup.txt"
-  timeout 60 wine regsvr32 /s "$SM_WINDOWS_BUILD/src/server/SessionMgr.dll" >"$log" 2>&1 || true
-  timeout 120 wine "$SM_WINDOWS_BUILD/apps/StationTool/sessionmgr.exe" sessions "*" >>"$log" 2>&1 || true
-  wineserver -k 2>/dev/null || true
-  sm_start_wine
-}

@@ -19,5 +19,4 @@ sm_start_wine
 trap sm_stop_wine EXIT
 sm_install_sim
 sm_register_external_server
-sm_warm_external_server
 (cd "$SM_WINDOWS_BUILD" && ctest --output-on-failure)

@@ -1,7 +1,7 @@
 #!/bin/sh
 # Runs sessionmgr.exe as an engineer would and checks its output and exit status.
-# Arguments: the wine-exec wrapper, the tool, a scratch folder.
-wine_exec="$1"; tool="$2"; out="$3"
+# Arguments: the wine-exec wrapper, the tool, a scratch folder, the external-process test client.
+wine_exec="$1"; tool="$2"; out="$3"; client="$4"
 mkdir -p "$out"
 fails=0
 
@@ -25,8 +25,6 @@ expect() {  # expect NAME FILE-SUFFIX TEXT: the output holds the line or text
 
 run help 0 --help
 expect help out "open NAME [--options TEXT]"
-run usage 2 open
-expect usage err "usage: sessionmgr open NAME [--options TEXT]"
 
 # A session opens, tells its category and handles; a custom session serves no handle.
 run open 0 open CUSTOM::Bench
@@ -45,6 +43,24 @@ run categories 0 categories --json
 expect categories out '"CUSTOM"'
 run state 0 state
 expect state out "In Process State:"
+
+# A session of the shared external process, locked by another program: the tool sees the lock, is
+# refused it, and breaks it.
+"$wine_exec" "$client" "get=*CUSTOM::ToolLock" "lock=Holder:5" "wait=ToolDone" >"$out/holder.txt" 2>&1 &
+holder=$!
+seen=0
+for attempt in $(seq 1 60); do
+  run sessions-external 0 sessions "*"
+  if grep -qF "*CUSTOM::ToolLock  (locked by 'Holder', level 1)" "$out/sessions-external.out"; then seen=1; break; fi
+  sleep 1
+done
+[ "$seen" = 1 ] || { echo "FAIL the holder's lock never showed:"; cat "$out/sessions-external.out" "$out/holder.txt"; fails=$((fails + 1)); }
+run refused 1 lock "*CUSTOM::ToolLock" --key Other --timeout 0
+expect refused err "sessionmgr: error -17402"
+run broken 0 unlock "*CUSTOM::ToolLock" --all
+expect broken out "*CUSTOM::ToolLock: unlocked"
+"$wine_exec" "$client" "signal=ToolDone" >"$out/release.txt" 2>&1
+wait "$holder"
 
 echo "fails=$fails"
 [ "$fails" = 0 ]
