@@ -108,6 +108,33 @@ SIM_EXPORT(GetSpecificDriverCHandle)(ViSession, ViSession* specific) {
     return static_cast<ViStatus>(Setting("SpecificStatus"));
 }
 
+// The inherent functions every IVI-C driver exports, reached through IVPPBase.
+SIM_EXPORT(reset)(ViSession) {
+    Count("reset");
+    return static_cast<ViStatus>(Setting("ResetStatus"));
+}
+
+SIM_EXPORT(self_test)(ViSession, std::int16_t* result, char* message) {
+    Count("self_test");
+    if (result) *result = static_cast<std::int16_t>(Setting("SelfTestResult"));
+    CopyText(Text("SelfTestMessage"), message, 256);
+    return static_cast<ViStatus>(Setting("SelfTestStatus"));
+}
+
+SIM_EXPORT(error_query)(ViSession, ViStatus* code, char* message) {
+    Count("error_query");
+    if (code) *code = static_cast<ViStatus>(Setting("ErrorQueryCode"));
+    CopyText(Text("ErrorQueryMessage"), message, 256);
+    return static_cast<ViStatus>(Setting("ErrorQueryStatus"));
+}
+
+SIM_EXPORT(revision_query)(ViSession, char* driverRevision, char* firmwareRevision) {
+    Count("revision_query");
+    CopyText(Text("DriverRevision"), driverRevision, 256);
+    CopyText(Text("FirmwareRevision"), firmwareRevision, 256);
+    return static_cast<ViStatus>(Setting("RevisionStatus"));
+}
+
 extern "C" BOOL WINAPI DllMain(HINSTANCE module, DWORD reason, LPVOID) {
     if (reason == DLL_PROCESS_ATTACH) {
         std::vector<std::string> missing;

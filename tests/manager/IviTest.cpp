@@ -177,6 +177,19 @@ TEST_F(Ivi, DriverErrorsCarryTheStatusAndTheDriversOwnTexts) {
     EXPECT_EQ(SimCount("IviDmm_64.dll", "IviDmm_InitWithOptions"), 3);
 }
 
+// Catches standard functions bound under the specific driver's prefix while the class driver serves.
+TEST_F(Ivi, StandardFunctionsGoToTheDriverInUse) {
+    WriteSetup(Store(3, "[IVI Driver IviDmm]\nDriverRevision = class 2.0\n"));
+    auto dmm = GetSession(manager.Get(), L"IVI::MyDmm");
+    ComPtr<IVPPBase> standard;
+    ASSERT_EQ(dmm->GetVPPBaseInterface(standard.Put()), S_OK) << TakeErrorInfo().description;
+    UniqueBstr driver, firmware;
+    LONG status = -1;
+    ASSERT_EQ(standard->Revision_Query(driver.Put(), firmware.Put(), &status), S_OK);
+    EXPECT_EQ(Text(driver.Get()), "class 2.0");
+    EXPECT_EQ(SimCount("IviDmm_64.dll", "IviDmm_revision_query"), 1);
+}
+
 TEST_F(Ivi, StateTextOfAnIviSession) {
     auto dmm = GetSession(manager.Get(), L"IVI::MyDmm");
     ASSERT_EQ(dmm->Initialize(nullptr), S_OK);
