@@ -34,106 +34,46 @@ sm_register_external_server
 
 # The simulated instruments, installed as a real installation places them: a VXIplug&play directory
 # C:\VXIPNP with the simulated driver simdmm and a configuration file that names the virtual
-# instrument BenchDMM and the logical names DMM1 and Serial1.
+# instrument BenchDMM and the logical names DMM1 and Serial1; the VISA, switch and IVI stand-ins
+# where their installers put them. Every stand-in reads the one demo bench, sim/simsetup.ini.
 sm_install_sim
-# Through the environment rather than the registry, so the prefix the tests share stays untouched.
-export VXIPNPPATH="$SM_SIM_VXIPNP_DIR_WINDOWS"
-# Every stand-in reads the one demo bench (docs/simulated-setup.md).
-timeout 60 wine winepath -w "$root/sim/simsetup.ini" >"$out/simsetup.winpath" 2>/dev/null || true
-export SM_SIM_SETUP="$(tr -d '\r\n' <"$out/simsetup.winpath")"
+sm_use_demo_bench "$out"
 
 status=0
 
-echo
-echo "== VBScript client: wine cscript examples/demo.vbs =="
-# cscript wants a Windows path, and exits 0 even when the script dies: its last line tells.
-timeout 60 wine winepath -w "$root/examples/demo.vbs" >"$out/demo.vbs.winpath" 2>/dev/null || true
-script="$(tr -d '\r\n' <"$out/demo.vbs.winpath")"
-timeout 120 wine cscript //nologo "$script" >"$out/demo.vbs.txt" 2>&1 || true
-tr -d '\r' <"$out/demo.vbs.txt"
-if ! tr -d '\r' <"$out/demo.vbs.txt" | grep -qx 'demo.vbs finished'; then
-  echo "demo.vbs stopped early (a script error ends cscript silently)"
-  status=1
-fi
-
-echo
-echo "== C++ client: wine DemoClient.exe =="
-if ! timeout 120 wine "$client" >"$out/DemoClient.txt" 2>&1; then
-  status=1
-fi
-tr -d '\r' <"$out/DemoClient.txt"
-if ! tr -d '\r' <"$out/DemoClient.txt" | grep -qx 'DemoClient finished'; then
-  echo "DemoClient.exe failed"
-  status=1
-fi
-
-echo
-echo "== VXIplug&play: wine cscript examples/vxipnp-demo.vbs and wine VxipnpDemo.exe =="
-timeout 60 wine winepath -w "$root/examples/vxipnp-demo.vbs" >"$out/vxipnp-demo.vbs.winpath" 2>/dev/null || true
-script="$(tr -d '\r\n' <"$out/vxipnp-demo.vbs.winpath")"
-timeout 120 wine cscript //nologo "$script" >"$out/vxipnp-demo.vbs.txt" 2>&1 || true
-tr -d '\r' <"$out/vxipnp-demo.vbs.txt"
-if ! tr -d '\r' <"$out/vxipnp-demo.vbs.txt" | grep -qx 'vxipnp-demo.vbs finished'; then
-  echo "vxipnp-demo.vbs stopped early (a script error ends cscript silently)"
-  status=1
-fi
-timeout 120 wine "$SM_WINDOWS_BUILD/examples/VxipnpDemo.exe" >"$out/VxipnpDemo.txt" 2>&1 || status=1
-tr -d '\r' <"$out/VxipnpDemo.txt"
-if ! tr -d '\r' <"$out/VxipnpDemo.txt" | grep -qx 'VxipnpDemo finished'; then
-  echo "VxipnpDemo.exe failed"
-  status=1
-fi
-
-echo "== VISA: examples/visa-demo.vbs and VisaDemo.exe share VISA sessions of the simulated visa32.dll =="
-# The simulated bench: the VISA library answers from sim/simsetup.ini.
-timeout 60 wine winepath -w "$root/sim/simsetup.ini" >"$out/simsetup.winpath" 2>/dev/null || true
-timeout 60 wine winepath -w "$root/examples/visa-demo.vbs" >"$out/visa-demo.vbs.winpath" 2>/dev/null || true
-export SM_SIM_SETUP="$(tr -d '\r\n' <"$out/simsetup.winpath")"
-timeout 120 wine cscript //nologo "$(tr -d '\r\n' <"$out/visa-demo.vbs.winpath")" >"$out/visa-demo.vbs.txt" 2>&1 || true
-timeout 120 wine "$SM_WINDOWS_BUILD/examples/VisaDemo.exe" >"$out/VisaDemo.txt" 2>&1 || status=1
-for piece in visa-demo.vbs VisaDemo; do
-  tr -d '\r' <"$out/$piece.txt"
-  if ! tr -d '\r' <"$out/$piece.txt" | grep -qx "$piece finished"; then
-    echo "$piece stopped early"
+# show NAME COMMAND...: runs one demo client, prints what it printed, and checks its last line
+# "NAME finished" (cscript exits 0 even when a script dies, so only that line tells).
+show() {
+  local name="$1"; shift
+  timeout 120 wine "$@" >"$out/$name.txt" 2>&1 || true
+  tr -d '\r' <"$out/$name.txt"
+  if ! tr -d '\r' <"$out/$name.txt" | grep -qx "$name finished"; then
+    echo "$name stopped early"
     status=1
   fi
   echo
-done
+}
+# script NAME.vbs: a VBScript client of examples/ under cscript, which wants a Windows path.
+script() {
+  timeout 60 wine winepath -w "$root/examples/$1" >"$out/$1.winpath" 2>/dev/null || true
+  show "$1" cscript //nologo "$(tr -d '\r\n' <"$out/$1.winpath")"
+}
 
-echo "== Switch routes and a switch session: wine RQDemo.exe, then wine cscript examples/rq-demo.vbs =="
-# The switch stand-ins read the demo bench, named through the environment like the VXIplug&play path.
-timeout 60 wine winepath -w "$root/sim/simsetup.ini" >"$out/simsetup.winpath" 2>/dev/null || true
-export SM_SIM_SETUP="$(tr -d '\r\n' <"$out/simsetup.winpath")"
-if ! timeout 120 wine "$SM_WINDOWS_BUILD/examples/RQDemo.exe" >"$out/RQDemo.txt" 2>&1; then
-  status=1
-fi
-tr -d '\r' <"$out/RQDemo.txt"
-echo
-timeout 60 wine winepath -w "$root/examples/rq-demo.vbs" >"$out/rq-demo.vbs.winpath" 2>/dev/null || true
-script="$(tr -d '\r\n' <"$out/rq-demo.vbs.winpath")"
-timeout 120 wine cscript //nologo "$script" >"$out/rq-demo.vbs.txt" 2>&1 || true
-tr -d '\r' <"$out/rq-demo.vbs.txt"
-if ! tr -d '\r' <"$out/rq-demo.vbs.txt" | grep -qx 'rq-demo.vbs finished'; then
-  echo "rq-demo.vbs stopped early (a script error ends cscript silently)"
-  status=1
-fi
-
-
-echo "== IVI over the bench sim/simsetup.ini: wine IviDemo.exe, then wine cscript examples/ivi-demo.vbs =="
-# The stand-ins read the bench named by SM_SIM_SETUP; without it the IVI store is empty.
-timeout 60 wine winepath -w "$root/examples/ivi-demo.vbs" >"$out/ivi-demo.vbs.winpath" 2>/dev/null || true
-timeout 60 wine winepath -w "$root/sim/simsetup.ini" >"$out/simsetup.winpath" 2>/dev/null || true
-bench="$(tr -d '\r\n' <"$out/simsetup.winpath")"
-SM_SIM_SETUP="$bench" timeout 120 wine "$SM_WINDOWS_BUILD/examples/IviDemo.exe" >"$out/IviDemo.txt" 2>&1 || true
-SM_SIM_SETUP="$bench" timeout 120 wine cscript //nologo "$(tr -d '\r\n' <"$out/ivi-demo.vbs.winpath")" \
-  >"$out/ivi-demo.vbs.txt" 2>&1 || true
-for file in IviDemo.txt:'IviDemo finished' ivi-demo.vbs.txt:'ivi-demo.vbs finished'; do
-  tr -d '\r' <"$out/${file%%:*}"
-  if ! tr -d '\r' <"$out/${file%%:*}" | grep -qx "${file#*:}"; then
-    echo "${file%%:*}: the client stopped early"
-    status=1
-  fi
-done
+echo "== Custom sessions, locks and listings: examples/demo.vbs and DemoClient.exe =="
+script demo.vbs
+show DemoClient "$client"
+echo "== VXIplug&play: examples/vxipnp-demo.vbs and VxipnpDemo.exe =="
+script vxipnp-demo.vbs
+show VxipnpDemo "$SM_WINDOWS_BUILD/examples/VxipnpDemo.exe"
+echo "== VISA: examples/visa-demo.vbs and VisaDemo.exe share VISA sessions of the simulated visa32.dll =="
+script visa-demo.vbs
+show VisaDemo "$SM_WINDOWS_BUILD/examples/VisaDemo.exe"
+echo "== Switch routes and a switch session: RQDemo.exe and examples/rq-demo.vbs =="
+show RQDemo "$SM_WINDOWS_BUILD/examples/RQDemo.exe"
+script rq-demo.vbs
+echo "== IVI over the bench sim/simsetup.ini: IviDemo.exe and examples/ivi-demo.vbs =="
+show IviDemo "$SM_WINDOWS_BUILD/examples/IviDemo.exe"
+script ivi-demo.vbs
 
 echo "== Two client processes, one session: wine ExternalDemoClient.exe first & second =="
 # Both start at once; the first request starts the shared external-process server, which leaves

@@ -21,9 +21,7 @@ mkdir -p "$out"
 timeout 60 wine regsvr32 /s "$SM_WINDOWS_BUILD/src/server/SessionMgr.dll" >"$out/regsvr32.txt" 2>&1 ||
   { echo "regsvr32 failed"; cat "$out/regsvr32.txt"; exit 1; }
 sm_install_sim
-export VXIPNPPATH="$SM_SIM_VXIPNP_DIR_WINDOWS"
-timeout 60 wine winepath -w "$root/sim/simsetup.ini" >"$out/simsetup.winpath" 2>/dev/null || true
-export SM_SIM_SETUP="$(tr -d '\r\n' <"$out/simsetup.winpath")"
+sm_use_demo_bench "$out"
 # Wine programs write to files, never into pipes.
 status=0
 timeout 7200 wine "$SM_WINDOWS_BUILD/bench/bench_leaks.exe" "$cycles" >"$out/leaks.txt" 2>"$out/leaks.err" || status=$?

@@ -112,6 +112,15 @@ sm_install_sim_ivi() {
 }
 
 
+# Points the product and the stand-ins of this shell at the demo bench: the VXIplug&play directory
+# through the environment (the registry of the shared prefix stays untouched) and sim/simsetup.ini.
+# The argument is a scratch folder (Wine programs write to files, never into $(...)).
+sm_use_demo_bench() {
+  export VXIPNPPATH="$SM_SIM_VXIPNP_DIR_WINDOWS"
+  timeout 60 wine winepath -w "$SM_ROOT/sim/simsetup.ini" >"$1/simsetup.winpath" 2>/dev/null || true
+  export SM_SIM_SETUP="$(tr -d '\r\n' <"$1/simsetup.winpath")"
+}
+
 # Every stand-in, installed into the Wine prefix (which must exist) the way a real installation places it.
 sm_install_sim() {
   sm_install_sim_vxipnp
