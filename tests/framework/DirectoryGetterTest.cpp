@@ -13,34 +13,40 @@
 #include "framework/TEException.h"
 
 using namespace sm;
-using sm::testing::ExpectTE;
+using namespace sm::testing;
 
 namespace {
+
+template <class Map, class Key>
+std::optional<std::string> Lookup(const Map& map, const Key& key) {
+    auto found = map.find(key);
+    return found == map.end() ? std::nullopt : std::optional<std::string>(found->second);
+}
 
 class TableSystem final : public DirectorySystem {
 public:
     std::optional<std::string> LoadedFrameworkModulePath() override { return framework; }
     std::optional<std::string> ClassesRootDefaultValue(std::string_view key) override {
-        auto found = classesRoot.find(std::string(key));
-        if (found == classesRoot.end()) return std::nullopt;
-        return found->second;
+        return Lookup(classesRoot, std::string(key));
     }
     std::optional<std::string> MachineValue(std::string_view key, std::string_view name, bool view64) override {
-        auto found = machine.find({std::string(key), std::string(name), view64});
-        if (found == machine.end()) return std::nullopt;
-        return found->second;
+        return Lookup(machine, std::tuple{std::string(key), std::string(name), view64});
     }
     std::string ShellFolder(int csidl) override {
         ++shellRequests;
-        if (failShellFolders) TE_RAISE(TE_PATH_NOT_FOUND, "TableSystem::ShellFolder");
-        if (csidl == 46) return "C:\\Users\\Public\\Documents";
-        if (csidl == 35) return "C:\\ProgramData";
-        if (csidl == 28) return "C:\\Users\\me\\AppData\\Local";
+        if (!failShellFolders && csidl == 46) return "C:\\Users\\Public\\Documents";
+        if (!failShellFolders && csidl == 35) return "C:\\ProgramData";
+        if (!failShellFolders && csidl == 28) return "C:\\Users\\me\\AppData\\Local";
         TE_RAISE(TE_PATH_NOT_FOUND, "TableSystem::ShellFolder");
     }
     bool FileExists(std::string_view path) override { return files.count(std::string(path)) != 0; }
 
-    void RegisterEngine(const std::string& path) { classesRoot[engineKey] = path; }
+    void RegisterEngine(const std::string& path) {
+        classesRoot["CLSID\\{E17A3C92-4B08-4F6D-95E1-A2C7083D5B64}\\InprocServer32"] = path;
+    }
+    void Override(const std::string& key, const std::string& value, bool view64 = true) {
+        machine[{"Software\\Quillvane\\Verentis\\" + key, "CfgLocation", view64}] = value;
+    }
 
     std::optional<std::string> framework;
     std::map<std::string, std::string> classesRoot;
@@ -48,11 +54,7 @@ public:
     std::set<std::string> files;
     int shellRequests = 0;
     bool failShellFolders = false;
-
-    static constexpr const char* engineKey = "CLSID\\{E17A3C92-4B08-4F6D-95E1-A2C7083D5B64}\\InprocServer32";
 };
-
-const std::string beacon = "DEV BUILD BEACON (Do not delete or install).txt";
 
 }  // namespace
 
@@ -89,10 +91,12 @@ TEST(InstalledLayout, InstallationIsThreeComponentsAboveTheLoadedFrameworkOrElse
     EXPECT_EQ(DirectoryGetter("2021", system).GetProgramsDirectory().View(), "D:\\Prod\\Verentis\\Bin\\");
 }
 
-TEST(DevelopmentLayout, TheBeaconMovesEveryDirectoryNextToTheInstallation) {
+TEST(DevelopmentLayout, TheBeaconMovesEveryDirectoryNextToTheInstallationAndOverridesToTheDevKey) {
     TableSystem system;
     system.RegisterEngine("D:\\Tree\\Verentis\\Bin\\x64\\Engine.dll");
-    system.files.insert("D:\\Tree\\Verentis\\" + beacon);
+    system.files.insert("D:\\Tree\\Verentis\\DEV BUILD BEACON (Do not delete or install).txt");
+    system.Override("2021", "X:\\released");
+    system.Override("2021dev", "X:\\development");
     DirectoryGetter getter("2021 (64-bit)", system);
     EXPECT_TRUE(getter.IsDevBuild());
     EXPECT_EQ(getter.GetProgramsDirectory().View(), "D:\\Tree\\Verentis\\Bin\\x64\\Release\\");
@@ -101,21 +105,12 @@ TEST(DevelopmentLayout, TheBeaconMovesEveryDirectoryNextToTheInstallation) {
     EXPECT_EQ(getter.GetLocalAppDataDirectory().View(), "D:\\Tree\\LocalAppData\\");
     EXPECT_EQ(getter.GetDefaultConfigDirectory().View(), "D:\\Tree\\CommonAppData\\Cfg\\");
     EXPECT_EQ(system.shellRequests, 0);
-}
-
-TEST(DevelopmentLayout, OverridesAreReadFromTheDevKey) {
-    TableSystem system;
-    system.RegisterEngine("D:\\Tree\\Verentis\\Bin\\x64\\Engine.dll");
-    system.files.insert("D:\\Tree\\Verentis\\" + beacon);
-    system.machine[{"Software\\Quillvane\\Verentis\\2021", "CfgLocation", true}] = "X:\\released";
-    system.machine[{"Software\\Quillvane\\Verentis\\2021dev", "CfgLocation", true}] = "X:\\development";
-    DirectoryGetter getter("2021", system);
     EXPECT_EQ(getter.GetConfigDirectory("2021", true).View(), "X:\\development");
 }
 
 TEST(RegistryOverrides, AbsoluteValuesReplaceTheDirectoryInTheirView) {
     TableSystem system;
-    system.machine[{"Software\\Quillvane\\Verentis\\A", "CfgLocation", false}] = "\\\\srv\\share\\cfg";
+    system.Override("A", "\\\\srv\\share\\cfg", false);
     system.machine[{"Software\\Quillvane\\Verentis\\A", "CustomPublicLocation", true}] = "P:\\public";
     DirectoryGetter getter("2021", system);
     EXPECT_EQ(getter.GetConfigDirectory("A", false).View(), "\\\\srv\\share\\cfg");
@@ -127,10 +122,9 @@ TEST(RegistryOverrides, AbsoluteValuesReplaceTheDirectoryInTheirView) {
 TEST(RegistryOverrides, EmptyAndRelativeValuesAreIgnored) {
     TableSystem system;
     for (std::string value : {"", "relative\\cfg", "C:", "C:cfg", "/unix/style"}) {
-        system.machine[{"Software\\Quillvane\\Verentis\\B", "CfgLocation", true}] = value;
-        DirectoryGetter getter("2021", system);
-        EXPECT_EQ(getter.GetConfigDirectory("B", true).View(), "C:\\ProgramData\\Quillvane\\Verentis 2021\\Cfg\\")
-            << value;
+        system.Override("B", value);
+        EXPECT_EQ(DirectoryGetter("2021", system).GetConfigDirectory("B", true).View(),
+                  "C:\\ProgramData\\Quillvane\\Verentis 2021\\Cfg\\") << value;
     }
 }
 
@@ -139,12 +133,12 @@ TEST(Caching, AnswersStayUntilTheCacheIsCleared) {
     DirectoryGetter getter("2021", system);
     Path before = getter.GetConfigDirectory("C", true);
     int shellRequests = system.shellRequests;
-    system.machine[{"Software\\Quillvane\\Verentis\\C", "CfgLocation", true}] = "Q:\\later";
+    system.Override("C", "Q:\\later");
     EXPECT_EQ(getter.GetConfigDirectory("C", true).View(), before.View());
     EXPECT_EQ(getter.GetCommonAppDataDirectory().View(), "C:\\ProgramData\\Quillvane\\Verentis 2021\\");
     EXPECT_EQ(system.shellRequests, shellRequests);
     // Another key or view is its own question, not the cached answer of the first.
-    system.machine[{"Software\\Quillvane\\Verentis\\D", "CfgLocation", true}] = "Q:\\other";
+    system.Override("D", "Q:\\other");
     EXPECT_EQ(getter.GetConfigDirectory("D", true).View(), "Q:\\other");
     getter.ClearCache();
     EXPECT_EQ(getter.GetConfigDirectory("C", true).View(), "Q:\\later");
@@ -157,9 +151,13 @@ TEST(Caching, OneGetterPerExactVersionText) {
     EXPECT_EQ(first.GetVersion(), "Version A");
 }
 
-TEST(Failures, AShellFolderThatCannotBeFoundFailsTheRequest) {
+// Catches a failing shell folder swallowed, and the default computed (and failing) even when an
+// absolute "CfgLocation" wins.
+TEST(Failures, AShellFolderThatCannotBeFoundFailsOnlyTheRequestsThatNeedIt) {
     TableSystem system;
     system.failShellFolders = true;
-    DirectoryGetter getter("2021", system);
-    EXPECT_EQ(sm::testing::CatchTE([&] { getter.GetConfigDirectory("E", true); }).GetErrorCode(), TE_PATH_NOT_FOUND);
+    system.Override("", "D:\\Bench\\Cfg");
+    DirectoryGetter getter("2021 (64-bit)", system);
+    EXPECT_EQ(CatchTE([&] { getter.GetConfigDirectory("E", true); }).GetErrorCode(), TE_PATH_NOT_FOUND);
+    EXPECT_EQ(getter.GetConfigDirectory("", true).View(), "D:\\Bench\\Cfg");
 }

@@ -13,14 +13,12 @@
 using namespace sm;
 using namespace sm::testing;
 
-TEST(DefaultMessages, ComeFromTheCodesRow) {
-    EXPECT_EQ(GetTEErrorMessage(TE_OPERATION_TIMED_OUT), "Operation Timed Out.");
-    EXPECT_EQ(GetTEErrorMessage(TE_OPERATION_FAILED), "Operation Failed.");
-    EXPECT_EQ(GetTEErrorMessage(TE_TYPE_MISMATCH_ERROR),
-              "Variable or property types do not match or are not compatible.");
-    EXPECT_EQ(GetTEErrorMessage(TE_NO_FILE_ASSOC), "No application is associated with the given filename extension.");
-    EXPECT_EQ(GetTEErrorMessage(-1), "User-defined error code.");
-    EXPECT_EQ(GetTEErrorMessage(-17999), "User-defined error code.");
+TEST(DefaultMessages, ComeFromTheCodesRowAndUnknownCodesAreUserDefined) {
+    for (auto [code, message] : {std::pair<int, const char*>{TE_OPERATION_TIMED_OUT, "Operation Timed Out."},
+                                 {TE_TYPE_MISMATCH_ERROR, "Variable or property types do not match or are not compatible."},
+                                 {TE_NO_FILE_ASSOC, "No application is associated with the given filename extension."},
+                                 {-1, "User-defined error code."}, {-17999, "User-defined error code."}})
+        EXPECT_EQ(GetTEErrorMessage(code), message) << code;
 }
 
 TEST(DefaultMessages, EveryTableRowHasItsOwnMessage) {
@@ -36,7 +34,6 @@ TEST(LanguageTable, LookupsIgnoreCaseAndMissingKeysGiveTheDefaultOrTheNotFoundTe
     EXPECT_EQ(GetLanguageString("te_errors", "te_operation_failed"), "Operation Failed.");
     EXPECT_EQ(GetLanguageString("Err_Descr", "cant_find_file"), "Could not find file '%1'.");
     EXPECT_EQ(GetLanguageString("TE_ERRORS", "NO_SUCH_KEY", "my default"), "my default");
-
     EXPECT_EQ(GetLanguageString("TE_ERRORS", "NO_SUCH_KEY"), "String not found in the language resource files");
     EXPECT_EQ(GetLanguageString("NO_SECTION", "TE_OPERATION_FAILED"), "String not found in the language resource files");
 }
@@ -89,11 +86,10 @@ TEST(Diagnostics, WriteDescriptionLines) {
                            "  " + caught.GetCompileDate() + "\n\nWhere caught:  CVXIPNPInstrSession::Initialize catch\n";
     EXPECT_EQ(text.str(), expected);
 
-    TEException plain = CatchTE([] { TE_RAISE(TE_PROGRAM_ERROR, "A::B"); });
-    std::ostringstream short_;
-    plain.WriteDescription("here", short_);
-    EXPECT_EQ(short_.str().find("API Function"), std::string::npos);
-    EXPECT_EQ(short_.str().find("Source:"), std::string::npos);
+    std::ostringstream plain;
+    CatchTE([] { TE_RAISE(TE_PROGRAM_ERROR, "A::B"); }).WriteDescription("here", plain);
+    EXPECT_EQ(plain.str().find("API Function"), std::string::npos);
+    EXPECT_EQ(plain.str().find("Source:"), std::string::npos);
 }
 
 TEST(Diagnostics, RaiseCanWriteToTheDebugOutputAtOnce) {
@@ -105,17 +101,15 @@ TEST(Diagnostics, RaiseCanWriteToTheDebugOutputAtOnce) {
 }
 
 TEST(Diagnostics, MissingArgumentWarningOnlyAboveLevelZero) {
-    StartDebugOutputCapture();
-    DynamicString quiet("x");
-    quiet.ReplaceArg(1, "y");
-    EXPECT_EQ(StopDebugOutputCapture(), "");
-
-    SetDebugOutputLevel(1);
-    StartDebugOutputCapture();
-    DynamicString loud("x");
-    loud.ReplaceArg(1, "y");
-    std::string written = StopDebugOutputCapture();
-    SetDebugOutputLevel(0);
+    auto warningOf = [](int level) {
+        SetDebugOutputLevel(level);
+        StartDebugOutputCapture();
+        DynamicString("x").ReplaceArg(1, "y");
+        SetDebugOutputLevel(0);
+        return StopDebugOutputCapture();
+    };
+    EXPECT_EQ(warningOf(0), "");
+    std::string written = warningOf(1);
     EXPECT_EQ(written.rfind("WARNING! 'Could not find argument to replace in string' Line ", 0), 0u);
     EXPECT_NE(written.find(" in function String::HandleMissingFormatArgument in file String.cpp\nCompilation Date: "),
               std::string::npos);

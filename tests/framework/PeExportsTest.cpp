@@ -1,10 +1,13 @@
-// Export names read straight from image bytes: what counts as a name, and every out-of-file
-// reference caught instead of read.
+// Export names read straight from image bytes: what counts as a name, every out-of-file reference
+// caught instead of read, and pages fetched only as they are needed.
 #include <gtest/gtest.h>
 
 #include "CatchTE.h"
 
+#include <algorithm>
 #include <cstdint>
+#include <cstring>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -12,68 +15,63 @@
 #include "framework/TEException.h"
 
 using namespace sm;
+using Names = std::vector<std::string>;
 
 namespace {
-// Builds a small 64-bit image: headers, then one section at file offset 0x200 (RVA 0x1000) holding
-// the export directory, the name pointer table and the names.
-class ImageBuilder {
-public:
-    std::vector<std::string> exportNames;
+void Put16(std::vector<unsigned char>& bytes, std::size_t at, std::uint32_t value) {
+    bytes[at] = static_cast<unsigned char>(value);
+    bytes[at + 1] = static_cast<unsigned char>(value >> 8);
+}
+void Put32(std::vector<unsigned char>& bytes, std::size_t at, std::uint32_t value) {
+    for (int shift = 0; shift < 4; ++shift) bytes[at + shift] = static_cast<unsigned char>(value >> (8 * shift));
+}
+
+constexpr std::uint32_t peOffset = 0x80, optionalOffset = peOffset + 24, optionalSize = 240, sectionRva = 0x1000;
+constexpr std::uint32_t sectionHeader = optionalOffset + optionalSize;
+
+// A small 64-bit image: headers, then one section at file offset `raw` (RVA 0x1000) holding the export
+// directory, the name pointer table and the names; filler up to `size` bytes.
+struct ImageBuilder {
+    Names exportNames;
     std::uint16_t magic = 0x20B;
     bool withExportDirectory = true;
+    std::uint32_t raw = 0x200, size = 0;
 
     std::vector<unsigned char> Build() const {
         std::vector<unsigned char> image(0x200, 0);
         Put16(image, 0, 0x5A4D);
         Put32(image, 0x3C, peOffset);
         Put32(image, peOffset, 0x00004550);
-        std::uint32_t coff = peOffset + 4;
-        Put16(image, coff + 2, 1);           // one section
-        Put16(image, coff + 16, optionalSize);
-        std::uint32_t optional = coff + 20;
-        Put16(image, optional, magic);
-        Put32(image, optional + 108, 16);    // data directories
-        if (withExportDirectory) Put32(image, optional + 112, sectionRva);
-        Put32(image, optional + 116, 40);
-        std::uint32_t section = optional + optionalSize;
-        image[section] = '.';
+        Put16(image, peOffset + 6, 1);  // one section
+        Put16(image, peOffset + 20, optionalSize);
+        Put16(image, optionalOffset, magic);
+        Put32(image, optionalOffset + 108, 16);  // data directories
+        if (withExportDirectory) Put32(image, optionalOffset + 112, sectionRva);
+        Put32(image, optionalOffset + 116, 40);
+        image[sectionHeader] = '.';
         // Section body: export directory (40 bytes), name pointers, then the names.
-        std::vector<unsigned char> body(40, 0);
+        std::vector<unsigned char> body(40 + 4 * exportNames.size(), 0);
         Put32(body, 24, static_cast<std::uint32_t>(exportNames.size()));
         Put32(body, 32, sectionRva + 40);
-        std::uint32_t namesStart = 40 + 4 * static_cast<std::uint32_t>(exportNames.size());
-        body.resize(namesStart);
         for (std::size_t index = 0; index < exportNames.size(); ++index) {
-            Put32(body, 40 + 4 * static_cast<std::uint32_t>(index), sectionRva + static_cast<std::uint32_t>(body.size()));
-            body.insert(body.end(), exportNames[index].begin(), exportNames[index].end());
-            body.push_back(0);
+            Put32(body, 40 + 4 * index, sectionRva + static_cast<std::uint32_t>(body.size()));
+            body.insert(body.end(), exportNames[index].c_str(), exportNames[index].c_str() + exportNames[index].size() + 1);
         }
-        Put32(image, section + 8, static_cast<std::uint32_t>(body.size()));   // virtual size
-        Put32(image, section + 12, sectionRva);
-        Put32(image, section + 16, static_cast<std::uint32_t>(body.size()));  // raw size
-        Put32(image, section + 20, 0x200);
+        Put32(image, sectionHeader + 8, static_cast<std::uint32_t>(body.size()));  // virtual size
+        Put32(image, sectionHeader + 12, sectionRva);
+        Put32(image, sectionHeader + 16, static_cast<std::uint32_t>(body.size()));  // raw size
+        Put32(image, sectionHeader + 20, raw);
+        image.resize(raw, 0xCC);
         image.insert(image.end(), body.begin(), body.end());
+        image.resize(std::max<std::size_t>(image.size(), size), 0xCC);
         return image;
-    }
-
-    static constexpr std::uint32_t peOffset = 0x80;
-    static constexpr std::uint16_t optionalSize = 240;
-    static constexpr std::uint32_t sectionRva = 0x1000;
-    static constexpr std::uint32_t optionalOffset = peOffset + 24;
-
-    static void Put16(std::vector<unsigned char>& bytes, std::size_t at, std::uint32_t value) {
-        bytes[at] = static_cast<unsigned char>(value);
-        bytes[at + 1] = static_cast<unsigned char>(value >> 8);
-    }
-    static void Put32(std::vector<unsigned char>& bytes, std::size_t at, std::uint32_t value) {
-        for (int shift = 0; shift < 4; ++shift) bytes[at + shift] = static_cast<unsigned char>(value >> (8 * shift));
     }
 };
 
-std::vector<std::string> Read(const std::vector<unsigned char>& image) {
+Names Read(const std::vector<unsigned char>& image) {
     StringVector names;
     ReadExportNames(image, names);
-    std::vector<std::string> plain;
+    Names plain;
     for (const auto& name : names) plain.emplace_back(name.View());
     return plain;
 }
@@ -86,69 +84,54 @@ void ExpectBadFormat(const std::vector<unsigned char>& image) {
 }  // namespace
 
 TEST(ExportNames, SortedUniqueAndStartingWithALetterOrUnderscore) {
-    ImageBuilder builder;
-    builder.exportNames = {"zeta_init", "abc_close", "_private", "1numeric", "?mangled@@", "abc_close", "Abc_Reset"};
-    EXPECT_EQ(Read(builder.Build()), (std::vector<std::string>{"Abc_Reset", "_private", "abc_close", "zeta_init"}));
+    ImageBuilder builder{{"zeta_init", "abc_close", "_private", "1numeric", "?mangled@@", "abc_close", "Abc_Reset"}};
+    EXPECT_EQ(Read(builder.Build()), (Names{"Abc_Reset", "_private", "abc_close", "zeta_init"}));
 }
 
 TEST(ExportNames, ThirtyTwoBitImagesAndMissingDirectoriesGiveNone) {
-    ImageBuilder builder;
-    builder.exportNames = {"abc_init"};
-    builder.magic = 0x10B;
-    EXPECT_TRUE(Read(builder.Build()).empty());
-    builder.magic = 0x20B;
-    builder.withExportDirectory = false;
-    EXPECT_TRUE(Read(builder.Build()).empty());
-    builder.withExportDirectory = true;
-    builder.exportNames.clear();
-    EXPECT_TRUE(Read(builder.Build()).empty());
-}
-
-TEST(ExportNames, SignaturesAreRequired) {
-    ImageBuilder builder;
-    builder.exportNames = {"abc_init"};
-    auto noDosSignature = builder.Build();
-    noDosSignature[0] = 'X';
-    ExpectBadFormat(noDosSignature);
-    auto noPeSignature = builder.Build();
-    noPeSignature[ImageBuilder::peOffset + 1] = 'X';
-    ExpectBadFormat(noPeSignature);
-    ExpectBadFormat({});
-    ExpectBadFormat({'M', 'Z'});
+    EXPECT_EQ(Read(ImageBuilder{{"abc_init"}, 0x10B}.Build()), Names{});
+    EXPECT_EQ(Read(ImageBuilder{{"abc_init"}, 0x20B, false}.Build()), Names{});
+    EXPECT_EQ(Read(ImageBuilder{}.Build()), Names{});
 }
 
 TEST(ExportNames, EveryOutOfFileReferenceIsCaught) {
-    ImageBuilder builder;
-    builder.exportNames = {"abc_init", "abc_close"};
-    const auto good = builder.Build();
+    const auto good = ImageBuilder{{"abc_init", "abc_close"}}.Build();
     ASSERT_EQ(Read(good).size(), 2u);
+    ExpectBadFormat({});
+    ExpectBadFormat({'M', 'Z'});
+    ExpectBadFormat(std::vector<unsigned char>(good.begin(), good.end() - 1));  // the last name's terminator cut off
+    const struct { std::size_t at; int bytes; std::uint32_t value; } corruptions[] = {
+        {0, 1, 'X'}, {peOffset + 1, 1, 'X'},  // the DOS and PE signatures
+        {0x3C, 4, 0xFFFFFFF0}, {peOffset + 6, 2, 0xFFFF}, {optionalOffset + 112, 4, 0x9000},
+        {sectionHeader + 20, 4, 0x7FFFFFFF}, {0x200 + 24, 4, 0x40000000}, {0x200 + 40, 4, 0x6000}};
+    for (const auto& c : corruptions) {
+        auto image = good;
+        if (c.bytes == 1) image[c.at] = static_cast<unsigned char>(c.value);
+        else if (c.bytes == 2) Put16(image, c.at, c.value);
+        else Put32(image, c.at, c.value);
+        SCOPED_TRACE(c.at);
+        ExpectBadFormat(image);
+    }
+}
 
-    auto peOutside = good;
-    ImageBuilder::Put32(peOutside, 0x3C, 0xFFFFFFF0);
-    ExpectBadFormat(peOutside);
-
-    auto sectionsOutside = good;
-    ImageBuilder::Put16(sectionsOutside, ImageBuilder::peOffset + 4 + 2, 0xFFFF);
-    ExpectBadFormat(sectionsOutside);
-
-    auto directoryNowhere = good;
-    ImageBuilder::Put32(directoryNowhere, ImageBuilder::optionalOffset + 112, 0x9000);
-    ExpectBadFormat(directoryNowhere);
-
-    auto rawOutside = good;
-    std::size_t section = ImageBuilder::optionalOffset + ImageBuilder::optionalSize;
-    ImageBuilder::Put32(rawOutside, section + 20, 0x7FFFFFFF);
-    ExpectBadFormat(rawOutside);
-
-    auto tooManyNames = good;
-    ImageBuilder::Put32(tooManyNames, 0x200 + 24, 0x40000000);
-    ExpectBadFormat(tooManyNames);
-
-    auto nameOutside = good;
-    ImageBuilder::Put32(nameOutside, 0x200 + 40, 0x1000 + 0x5000);
-    ExpectBadFormat(nameOutside);
-
-    // A name that runs to the end of the file without its terminator.
-    std::vector<unsigned char> truncated(good.begin(), good.end() - 1);
-    ExpectBadFormat(truncated);
+// Catches a reader that fetches the whole file, or that cuts or garbles a name at a page boundary:
+// in a 256 KB image the second name starts six bytes before 0xC000 (pages are 16 KB).
+TEST(ExportNamesPaged, FetchesOnlyNeededPagesAndReadsNamesAcrossPageBoundaries) {
+    const std::string first = "drv_init_" + std::string(192, 'p');  // 0xBF30 to 0xBFF9
+    const auto image = ImageBuilder{{first, "drv_close_with_a_long_name"}, 0x20B, true, 0xBF00, 0x40000}.Build();
+    std::set<std::uint64_t> fetchedPages;
+    std::uint64_t fetchedBytes = 0;
+    StringVector names;
+    ReadExportNames([&](std::uint64_t offset, std::span<unsigned char> into) -> std::size_t {
+        std::size_t count = offset < image.size() ? std::min<std::size_t>(into.size(), image.size() - offset) : 0;
+        std::memcpy(into.data(), image.data() + offset, count);
+        fetchedPages.insert(offset / 16384);
+        fetchedBytes += count;
+        return count;
+    }, names);
+    ASSERT_EQ(names.size(), 2u);
+    EXPECT_EQ(std::string(names[0].View()), "drv_close_with_a_long_name");
+    EXPECT_EQ(std::string(names[1].View()), first);
+    EXPECT_EQ(fetchedPages, (std::set<std::uint64_t>{0, 2, 3}));
+    EXPECT_EQ(fetchedBytes, 3u * 16384u);
 }

@@ -3,12 +3,10 @@
 #include <gtest/gtest.h>
 #include <windows.h>
 
-#include <fstream>
-#include <iterator>
 #include <string>
 
+#include "TempFolder.h"
 #include "sources/ConfigurationFile.h"
-#include "sources/ConfigurationFileHeader.h"
 #include "sources/VxipnpInfo.h"
 
 using namespace sm;
@@ -16,20 +14,18 @@ using namespace sm;
 namespace {
 constexpr const char* vxipnpKey = "SOFTWARE\\VXIPNP_Alliance\\VXIPNP\\CurrentVersion";
 
-std::string TempFolder(const char* name) {
-    char temp[MAX_PATH];
-    ::GetTempPathA(MAX_PATH, temp);
-    std::string folder = std::string(temp) + name;
-    ::CreateDirectoryA(folder.c_str(), nullptr);
-    return folder;
-}
+const std::string temp = [] {
+    char path[MAX_PATH];
+    ::GetTempPathA(MAX_PATH, path);
+    return std::string(path);
+}();
+const std::string registryFolder = temp + "SessionMgrRegistryVxipnp", environmentFolder = temp + "SessionMgrEnvironmentVxipnp";
 
 class RegistryDirectory : public ::testing::Test {
 protected:
     static void SetUpTestSuite() {
-        registryFolder = TempFolder("SessionMgrRegistryVxipnp");
-        environmentFolder = TempFolder("SessionMgrEnvironmentVxipnp");
-        ::CreateDirectoryA((registryFolder + "\\Win64").c_str(), nullptr);
+        for (const std::string& folder : {registryFolder, environmentFolder, registryFolder + "\\Win64"})
+            ::CreateDirectoryA(folder.c_str(), nullptr);
         ::DeleteFileA((registryFolder + "\\Win64\\QVSessionMgr.ini").c_str());
         HKEY key = nullptr;
         ASSERT_EQ(::RegCreateKeyExA(HKEY_LOCAL_MACHINE, vxipnpKey, 0, nullptr, 0, KEY_WRITE, nullptr, &key, nullptr),
@@ -40,7 +36,6 @@ protected:
         ::SetEnvironmentVariableA("VXIPNPPATH", environmentFolder.c_str());
     }
     static void TearDownTestSuite() { ::RegDeleteKeyValueA(HKEY_LOCAL_MACHINE, vxipnpKey, "VXIPNPPATH"); }
-    static inline std::string registryFolder, environmentFolder;
 };
 }  // namespace
 
@@ -48,13 +43,10 @@ TEST_F(RegistryDirectory, WinsOverTheEnvironmentAndReceivesTheFile) {
     Path directory;
     ASSERT_TRUE(GetVxipnpDirectory(directory));
     EXPECT_EQ(std::string(directory.View()), registryFolder);
-
     VxipnpInfo source;
     EXPECT_EQ(source.GetConfigurationLists(), 1);
-    std::ifstream written(registryFolder + "\\Win64\\QVSessionMgr.ini", std::ios::binary);
-    std::string text{std::istreambuf_iterator<char>(written), std::istreambuf_iterator<char>()};
-    EXPECT_NE(text.find(";; NO VXIPNP drivers found!\r\n"), std::string::npos);
-
+    EXPECT_NE(sm::testing::ReadFileBytes(registryFolder + "\\Win64\\QVSessionMgr.ini").find(";; NO VXIPNP drivers found!\r\n"),
+              std::string::npos);
     DynamicString state;
     source.AppendStateDescription(state);
     EXPECT_NE(std::string(state.View()).find("VXIPNP directory from registry: " + registryFolder +

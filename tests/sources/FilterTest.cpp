@@ -10,10 +10,9 @@
 
 using namespace sm;
 using sm::testing::DoubleByteCodePage;
-
-namespace {
 using Texts = std::vector<std::string>;
 
+namespace {
 Texts Split(std::string_view filter) {
     Texts texts;
     for (const auto& piece : SplitFilterList(filter)) texts.emplace_back(piece.View());
@@ -27,66 +26,41 @@ public:
 };
 
 bool Excluded(std::string_view filter, std::string_view specificPrefix) {
-    FilterOnlySource source;
-    return source.ExcludedBySpecificPrefix(SplitFilterList(filter), specificPrefix);
+    return FilterOnlySource().ExcludedBySpecificPrefix(SplitFilterList(filter), specificPrefix);
 }
 }  // namespace
 
-TEST(SplitFilterList, PiecesBetweenCommas) {
-    EXPECT_EQ(Split(""), Texts{});
-    EXPECT_EQ(Split("abc"), Texts{"abc"});
-    EXPECT_EQ(Split("a,b,c"), (Texts{"a", "b", "c"}));
-    // Two commas in a row give an empty filter text; a final comma adds nothing.
-    EXPECT_EQ(Split("a,,b"), (Texts{"a", "", "b"}));
-    EXPECT_EQ(Split("a,"), Texts{"a"});
-    EXPECT_EQ(Split("a,,"), (Texts{"a", ""}));
-    EXPECT_EQ(Split(","), Texts{""});
-    EXPECT_EQ(Split(",a"), (Texts{"", "a"}));
+// Two commas in a row give an empty filter text, a final comma adds nothing, blanks around pieces go,
+// and blanks alone are one (empty) filter, unlike an empty filter text.
+TEST(SplitFilterList, PiecesBetweenCommasWithoutTheirBlanks) {
+    const std::pair<const char*, Texts> cases[] = {
+        {"", {}}, {"abc", {"abc"}}, {"a,b,c", {"a", "b", "c"}}, {"a,,b", {"a", "", "b"}}, {"a,", {"a"}},
+        {"a,,", {"a", ""}}, {",", {""}}, {",a", {"", "a"}}, {"a , , b", {"a", "", "b"}}, {"   ", {""}}, {"a,  ", {"a", ""}},
+        {"  SpecificPrefix=hp34401a ,\tSpecificPrefix = ag34401a\r\n", {"SpecificPrefix=hp34401a", "SpecificPrefix = ag34401a"}}};
+    for (const auto& [filter, pieces] : cases) EXPECT_EQ(Split(filter), pieces) << filter;
 }
 
-TEST(SplitFilterList, BlanksAroundPiecesAreRemoved) {
-    EXPECT_EQ(Split("  SpecificPrefix=hp34401a ,\tSpecificPrefix = ag34401a\r\n"),
-              (Texts{"SpecificPrefix=hp34401a", "SpecificPrefix = ag34401a"}));
-    EXPECT_EQ(Split("a , , b"), (Texts{"a", "", "b"}));
-    // Blanks alone are one (empty) filter, unlike an empty filter text.
-    EXPECT_EQ(Split("   "), Texts{""});
-    EXPECT_EQ(Split("a,  "), (Texts{"a", ""}));
-}
-
-TEST(ExcludedBySpecificPrefix, PrefixFiltersKeepTheirPrefixesOnly) {
-    EXPECT_FALSE(Excluded("", "hp34401a")) << "no filters keep everything";
-    const char* filter = "SpecificPrefix=hp34401a, SpecificPrefix = ag34401a";
-    for (const char* kept : {"hp34401a", "ag34401a", "AG34401A"}) EXPECT_FALSE(Excluded(filter, kept)) << kept;
-    for (const char* excluded : {"ke34401a", "hp34401", ""}) EXPECT_TRUE(Excluded(filter, excluded)) << excluded;
-}
-
-TEST(ExcludedBySpecificPrefix, FiltersOfAnotherFormExcludeEveryPrefix) {
-    EXPECT_TRUE(Excluded("abc", "hp34401a"));
-    EXPECT_TRUE(Excluded("abc, def", "abc"));
-    // An empty filter text counts as a filter.
-    EXPECT_TRUE(Excluded("   ", "hp34401a"));
-    // A prefix filter among others still lets its prefix through.
-    EXPECT_FALSE(Excluded("abc,,SpecificPrefix=hp34401a", "hp34401a"));
-}
-
-TEST(ExcludedBySpecificPrefix, KeywordFormsThatCount) {
-    // The keyword is found in any case, anywhere in the filter, with blanks before "=".
-    EXPECT_FALSE(Excluded("specificprefix=hp34401a", "hp34401a"));
-    EXPECT_FALSE(Excluded("Use SpecificPrefix \t = hp34401a", "hp34401a"));
-    EXPECT_FALSE(Excluded("SpecificPrefix=  hp34401a  ", "hp34401a"));
-    // Everything after "=" is the value, blanks inside included.
-    EXPECT_FALSE(Excluded("SpecificPrefix=hp 34401a", "hp 34401a"));
-    EXPECT_TRUE(Excluded("SpecificPrefix=hp 34401a", "hp"));
-}
-
-TEST(ExcludedBySpecificPrefix, KeywordFormsThatDoNotCount) {
-    // Nothing after the keyword, no "=" after it, or "=" only before it: the filter names no prefix.
-    EXPECT_TRUE(Excluded("SpecificPrefix", "hp34401a"));
-    EXPECT_TRUE(Excluded("SpecificPrefix hp34401a", "hp34401a"));
-    EXPECT_TRUE(Excluded("x=hp34401a SpecificPrefix", "hp34401a"));
-    EXPECT_TRUE(Excluded("Prefix=hp34401a", "hp34401a"));
-    // An empty value matches only an empty prefix.
-    EXPECT_TRUE(Excluded("SpecificPrefix=", "hp34401a"));
+TEST(ExcludedBySpecificPrefix, OnlyPrefixFiltersLetTheirPrefixesThrough) {
+    const struct { const char *filter, *prefix; bool excluded; } cases[] = {
+        {"", "hp34401a", false},  // no filters keep everything
+        {"SpecificPrefix=hp34401a, SpecificPrefix = ag34401a", "hp34401a", false},
+        {"SpecificPrefix=hp34401a, SpecificPrefix = ag34401a", "AG34401A", false},
+        {"SpecificPrefix=hp34401a, SpecificPrefix = ag34401a", "ke34401a", true},
+        {"SpecificPrefix=hp34401a, SpecificPrefix = ag34401a", "hp34401", true},
+        {"SpecificPrefix=hp34401a, SpecificPrefix = ag34401a", "", true},
+        // Filters of another form, an empty filter text included, exclude every prefix...
+        {"abc", "hp34401a", true}, {"abc, def", "abc", true}, {"   ", "hp34401a", true},
+        // ...but a prefix filter among them still lets its prefix through.
+        {"abc,,SpecificPrefix=hp34401a", "hp34401a", false},
+        // The keyword is found in any case, anywhere, with blanks before "="; all after "=" is the value.
+        {"specificprefix=hp34401a", "hp34401a", false}, {"Use SpecificPrefix \t = hp34401a", "hp34401a", false},
+        {"SpecificPrefix=  hp34401a  ", "hp34401a", false}, {"SpecificPrefix=hp 34401a", "hp 34401a", false},
+        {"SpecificPrefix=hp 34401a", "hp", true},
+        // Nothing after the keyword, no "=" after it, "=" only before it, or an empty value: no prefix named.
+        {"SpecificPrefix", "hp34401a", true}, {"SpecificPrefix hp34401a", "hp34401a", true},
+        {"x=hp34401a SpecificPrefix", "hp34401a", true}, {"Prefix=hp34401a", "hp34401a", true},
+        {"SpecificPrefix=", "hp34401a", true}};
+    for (const auto& c : cases) EXPECT_EQ(Excluded(c.filter, c.prefix), c.excluded) << c.filter << " / " << c.prefix;
 }
 
 TEST_F(DoubleByteCodePage, ExcludedBySpecificPrefixCountsCharactersBeforeTheKeyword) {
