@@ -36,7 +36,7 @@ private:
 
 class LineStream {
 public:
-    static constexpr std::size_t blockBytes = 2048;
+    static constexpr std::size_t blockBytes = 32768;
     static constexpr std::size_t maxLineBytes = 640;
 
     explicit LineStream(LineSource& source) : source(source) {}

@@ -83,14 +83,15 @@ TEST(IniLines, EndAtLfCrOrNulAndPairedEndsCountOnce) {
 
 TEST(IniLines, PairedEndsSplitAcrossBlocksAndLongLines) {
     for (std::string ending : {"\r\n", "\n\r"}) {
-        // The filler line ends at byte 1500, so the second line's CR or LF is the block's last byte.
-        std::string filler = std::string(1500, 'f') + "\n", second(LineStream::blockBytes - 1 - filler.size(), 'x');
+        // The filler line ends 300 bytes before the block does, so the second line's CR or LF is the
+        // block's last byte.
+        std::string filler = std::string(LineStream::blockBytes - 301, 'f') + "\n", second(299, 'x');
         EXPECT_EQ(Lines(filler + second + ending + "next"), (Texts{f640, second, "next"}));
     }
     // Long lines keep their first 640 bytes, over several blocks too, and the next line is intact.
     EXPECT_EQ(Lines("head\n" + std::string(LineStream::blockBytes - 2, 'f') + "\r\nzwwwwwwwwww\n"),
               (Texts{"head", f640, "zwwwwwwwwww"}));
-    EXPECT_EQ(Lines(std::string(5000, 'f') + "\r\nafter\n"), (Texts{f640, "after"}));
+    EXPECT_EQ(Lines(std::string(2 * LineStream::blockBytes + 5, 'f') + "\r\nafter\n"), (Texts{f640, "after"}));
     EXPECT_EQ(Lines(f640), Texts{f640});
 }
 
