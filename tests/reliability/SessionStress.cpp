@@ -1,15 +1,11 @@
-// Stress through the registered DLL: worker threads mix the manager's and the sessions' methods (get
-// and release the same names, new sessions and renaming them, items, lock and unlock with shared keys
-// and short timeouts, listings and state texts while sessions come and go) for a given time. A worker
-// that has not ended stall-seconds after the stop is taken for a deadlock: the program prints what it
-// was doing and ends. At the end every lock must be free, every session but the pinned ones gone,
-// and the table empty once those are released.
+// Stress through the registered DLL: worker threads get and release the same names, make and rename
+// new sessions, attach and detach items, lock and unlock with shared keys and short timeouts, and list
+// and describe while sessions come and go. A worker still running stall-seconds after the stop is
+// taken for a deadlock (exit 3, with what it was doing; "demo-deadlock" shows it: the main thread
+// keeps the first name's lock that worker 0 waits for). Exit 0: no failed call and, at the end, every
+// lock free, only the pinned sessions live and none once those are released.
 //
 //     SessionStress [seconds=10] [threads=8] [stall-seconds=120] [demo-deadlock]
-//
-// Exit 0: no failed call, no deadlock, every invariant held; 3 after a deadlock report.
-// "demo-deadlock" shows the deadlock report: the main thread keeps the first name's session lock
-// and worker 0 waits for it without a timeout.
 #include <objbase.h>
 #include <windows.h>
 
@@ -53,10 +49,9 @@ bool Check(HRESULT result, const char* what) {
 UniqueBstr Bstr(const std::wstring& text) { return UniqueBstr(::SysAllocString(text.c_str())); }
 
 struct Worker {
-    unsigned index = 0;
     UniqueKernelHandle thread;
     std::atomic<int> current{0};
-    std::uint64_t calls = 0, lockTimeouts = 0;
+    std::uint64_t index = 0, calls = 0, lockTimeouts = 0;
 };
 
 class WorkerRun {
@@ -205,7 +200,7 @@ int main(int argc, char** argv) {
         std::vector<Worker> workers(threads);
         std::vector<HANDLE> handles;
         for (Worker& worker : workers) {
-            worker.index = static_cast<unsigned>(handles.size());
+            worker.index = handles.size();
             worker.thread.Reset(::CreateThread(nullptr, 0, WorkerThread, &worker, 0, nullptr));
             handles.push_back(worker.thread.Get());
         }
@@ -214,7 +209,7 @@ int main(int argc, char** argv) {
         if (::WaitForMultipleObjects(threads, handles.data(), TRUE, static_cast<DWORD>(stallSeconds * 1000)) == WAIT_TIMEOUT) {
             std::printf("DEADLOCK: workers still running %.0f s after the stop:\n", stallSeconds);
             for (Worker& worker : workers)
-                if (::WaitForSingleObject(worker.thread.Get(), 0) == WAIT_TIMEOUT) std::printf("   worker %u in %s\n", worker.index, operationNames[worker.current]);
+                if (::WaitForSingleObject(worker.thread.Get(), 0) == WAIT_TIMEOUT) std::printf("   worker %llu in %s\n", static_cast<unsigned long long>(worker.index), operationNames[worker.current]);
             std::fflush(stdout);
             // Stuck threads hold locks that DLL detach would wait for: leave at once.
             ::TerminateProcess(::GetCurrentProcess(), 3);
