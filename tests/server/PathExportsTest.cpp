@@ -91,19 +91,15 @@ struct EngineRegistration {
 
 const std::string beacon = "DEV BUILD BEACON (Do not delete or install).txt";
 
-// Installed-layout tests need a machine without the engine registered (a crashed earlier run may
-// have left one behind).
-class InstalledLayout : public ::testing::Test {
-    void SetUp() override { EngineRegistration::Remove(); }
-};
-
 }  // namespace
 
 // Which values count is the directory rules' own decision (DirectoryGetterTest); here the real
-// registry's two views, an expandable value and a missing key.
-TEST_F(InstalledLayout, ConfigDirectoryFollowsCfgLocationInItsViewOrIsTheDefault) {
+// registry's two views, an expandable value, a missing key and the shell folders. A crashed earlier
+// run may have left the engine registered: an installed layout needs it gone.
+TEST(InstalledLayout, DirectoriesFromTheRegistryInItsViewOrTheShellFolders) {
+    EngineRegistration::Remove();
     std::string version = UniqueVersion("Installed");
-    std::string expectedDefault = ShellFolder(CSIDL_COMMON_APPDATA) + "\\Quillvane\\Verentis " + version + "\\Cfg\\";
+    std::string product = "\\Quillvane\\Verentis " + version + "\\", expectedDefault = ShellFolder(CSIDL_COMMON_APPDATA) + product + "Cfg\\";
     EXPECT_EQ(Directory("GetDefaultConfigDirectory", version), expectedDefault);
     EXPECT_EQ(Directory("GetConfigDirectory", version, "NoSuchKey", 1), expectedDefault);
     ProductValue in64("PathExportsTest64", "CfgLocation", REG_SZ, "C:\\Custom Cfg\\", true);
@@ -114,16 +110,9 @@ TEST_F(InstalledLayout, ConfigDirectoryFollowsCfgLocationInItsViewOrIsTheDefault
     EXPECT_EQ(Directory("GetConfigDirectory", version, "PathExportsTest32", 0), "\\\\server\\share\\cfg");
     EXPECT_EQ(Directory("GetConfigDirectory", version, "PathExportsTest32", 1), expectedDefault);
     EXPECT_EQ(Directory("GetConfigDirectory", version, "PathExportsTestExpand", 1), "C:\\Expanded");
-}
-
-TEST_F(InstalledLayout, PublicAndApplicationDataDirectories) {
-    std::string version = UniqueVersion("Installed");
-    std::string product = "\\Quillvane\\Verentis " + version + "\\";
     EXPECT_EQ(Directory("GetVerentisCommonAppDataDirectory", version), ShellFolder(CSIDL_COMMON_APPDATA) + product);
     EXPECT_EQ(Directory("GetVerentisLocalAppDataDirectory", version), ShellFolder(CSIDL_LOCAL_APPDATA) + product);
     EXPECT_EQ(Directory("GetVerentisPublicDirectory", version, "NoSuchKey"), ShellFolder(CSIDL_COMMON_DOCUMENTS) + product);
-    ProductValue custom("PathExportsTestPublic", "CustomPublicLocation", REG_SZ, "D:\\Shared Public", true);
-    EXPECT_EQ(Directory("GetVerentisPublicDirectory", version, "PathExportsTestPublic"), "D:\\Shared Public");
 }
 
 TEST(DevelopmentLayout, TheBeaconBesideTheRegisteredEngineMakesADevelopmentBuild) {

@@ -20,12 +20,9 @@ HRESULT CallDllCanUnloadNow() {
 class OuterObject final : public IUnknown {
 public:
     STDMETHODIMP QueryInterface(REFIID interfaceId, void** result) override {
-        if (IsEqualIID(interfaceId, IID_IUnknown)) {
-            *result = this;
-            AddRef();
-            return S_OK;
-        }
-        return inner ? inner->QueryInterface(interfaceId, result) : E_NOINTERFACE;
+        if (!IsEqualIID(interfaceId, IID_IUnknown)) return inner ? inner->QueryInterface(interfaceId, result) : E_NOINTERFACE;
+        *result = this;
+        return AddRef(), S_OK;
     }
     STDMETHODIMP_(ULONG) AddRef() override { return ++references; }
     STDMETHODIMP_(ULONG) Release() override { return --references; }
@@ -44,14 +41,16 @@ TEST(SingletonManager, EveryCreationGivesTheSameObjectAndAggregationIsRefused) {
     EXPECT_FALSE(outer.inner);
 }
 
-TEST(ClassObjects, SessionClassesAggregateOnlyAskedForIUnknown) {
+TEST(ClassObjects, SessionClassesAggregateOnlyAskedForIUnknownAndWorkWithoutAManager) {
     OuterObject outer;
     ComPtr<IInstrSession> session;
     EXPECT_EQ(::CoCreateInstance(CLSID_CustomInstrSession, &outer, CLSCTX_INPROC_SERVER, IID_IInstrSession, session.PutVoid()),
               CLASS_E_NOAGGREGATION);
     ASSERT_EQ(::CoCreateInstance(CLSID_CustomInstrSession, &outer, CLSCTX_INPROC_SERVER, IID_IUnknown, outer.inner.PutVoid()), S_OK);
-    // Through the outer object the inner interface answers, and its IUnknown is the outer one.
+    // Through the outer object the inner interface answers, and its IUnknown is the outer one; a
+    // session made without a manager works.
     ASSERT_EQ(outer.QueryInterface(IID_IInstrSession, session.PutVoid()), S_OK);
+    EXPECT_EQ(session->AttachLong(Bstr(L"A").Get(), 5), S_OK);
     ComPtr<IUnknown> identity;
     ASSERT_EQ(session->QueryInterface(IID_IUnknown, identity.PutVoid()), S_OK);
     EXPECT_EQ(identity.Get(), static_cast<IUnknown*>(&outer));
@@ -68,12 +67,6 @@ TEST(ClassObjects, VisaSessionsHaveNoClassObject) {
     ComPtr<IClassFactory> factory;
     EXPECT_EQ(getClassObject(CLSID_VisaInstrSession, IID_IClassFactory, factory.PutVoid()), CLASS_E_CLASSNOTAVAILABLE);
     EXPECT_EQ(getClassObject(CLSID_CustomInstrSession, IID_IClassFactory, factory.PutVoid()), S_OK);
-}
-
-TEST(ClassObjects, DirectlyCreatedSessionsWorkWithoutAManager) {
-    ComPtr<IInstrSession> session;
-    ASSERT_EQ(::CoCreateInstance(CLSID_CustomInstrSession, nullptr, CLSCTX_INPROC_SERVER, IID_IInstrSession, session.PutVoid()), S_OK);
-    EXPECT_EQ(session->AttachLong(Bstr(L"A").Get(), 5), S_OK);
 }
 
 TEST(Unloading, OnlyTheFactoryHoldingTheManagerLetsTheDllGo) {
