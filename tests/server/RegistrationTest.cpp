@@ -72,11 +72,6 @@ std::string DumpServedClasses(const std::string& modulePath) {
     return text;
 }
 
-HRESULT CreateManagerResult() {
-    ComPtr<IInstrSessionMgr> manager;
-    return ::CoCreateInstance(CLSID_InstrSessionMgr, nullptr, CLSCTX_INPROC_SERVER, IID_IInstrSessionMgr, manager.PutVoid());
-}
-
 class Registration : public ::testing::Test {
 protected:
     void SetUp() override {
@@ -115,8 +110,6 @@ TEST_F(Registration, UnregisterRemovesEveryClassAndTheTypeLibrary) {
     // The shared key that holds every class stays.
     EXPECT_TRUE(KeyExists("CLSID"));
     EXPECT_FALSE(KeyExists(std::string("TypeLib\\") + libraryId));
-    EXPECT_EQ(::LoadRegTypeLib(LIBID_SM, 1, 0, 0x409, ComPtr<ITypeLib>().Put()), TYPE_E_LIBNOTREGISTERED);
-    EXPECT_EQ(CreateManagerResult(), REGDB_E_CLASSNOTREG);
     // Unregistering an unregistered server succeeds.
     EXPECT_EQ(unregisterServer(), S_OK);
 }
@@ -136,7 +129,6 @@ TEST_F(Registration, WritesEveryKeyOfTheTable) {
     const std::string versionKey = std::string("TypeLib\\") + libraryId + "\\1.0";
     ASSERT_TRUE(ReadString(versionKey + "\\409\\win64").has_value());
     EXPECT_EQ(ReadString(versionKey + "\\0\\win64"), ReadString(versionKey + "\\409\\win64"));
-    EXPECT_EQ(CreateManagerResult(), S_OK);
 }
 
 // Leftovers of an older registration under a class key must not survive a new one, nor may a
