@@ -21,6 +21,7 @@ namespace {
 UniqueBstr Bstr(const std::string& text) { return UniqueBstr(AnsiToBstr(text)); }
 std::string Text(BSTR text) { return BstrToMultiByte(text); }
 
+// The thread's error text on one line, or "<none>".
 std::string Description() {
     ComPtr<IErrorInfo> info;
     UniqueBstr text;
@@ -32,8 +33,7 @@ std::string Description() {
 
 ComPtr<IExternalProcessServer> Server() {
     ComPtr<IExternalProcessServer> server;
-    ::CoCreateInstance(CLSID_ExternalProcessServer, nullptr, CLSCTX_LOCAL_SERVER, IID_IExternalProcessServer,
-                       server.PutVoid());
+    ::CoCreateInstance(CLSID_ExternalProcessServer, nullptr, CLSCTX_LOCAL_SERVER, IID_IExternalProcessServer, server.PutVoid());
     return server;
 }
 
@@ -55,20 +55,21 @@ struct Client {
         auto text = Bstr(first);
         bool needsSession = verb == "attach" || verb == "read" || verb == "lock" || verb == "unlock" || verb == "break";
         if (needsSession && !session) return !std::printf("%s: no session\n", verb.c_str());
+        HRESULT result = S_OK;
+        LONG number = 0, count = -1;
+        VARIANT_BOOL flag = VARIANT_FALSE;
+        UniqueBstr out;
         if (verb == "get") {
-            HRESULT result = manager->GetInstrSession(Bstr(argument).Get(), VARIANT_FALSE, session.Put());
-            UniqueBstr name;
-            VARIANT_BOOL external = VARIANT_FALSE;
-            if (FAILED(result)) return std::printf("get %s hr=0x%08lx desc=%s\n", argument.c_str(), result, Description().c_str());
-            session->get_Name(name.Put());
-            session->get_InExternalProcess(&external);
-            std::printf("get %s hr=0x%08lx name=%s external=%d\n", argument.c_str(), result, Text(name.Get()).c_str(), external);
+            if (FAILED(result = manager->GetInstrSession(Bstr(argument).Get(), VARIANT_FALSE, session.Put())))
+                return std::printf("get %s hr=0x%08lx desc=%s\n", argument.c_str(), result, Description().c_str());
+            session->get_Name(out.Put());
+            session->get_InExternalProcess(&flag);
+            std::printf("get %s hr=0x%08lx name=%s external=%d\n", argument.c_str(), result, Text(out.Get()).c_str(), flag);
         } else if (verb == "attach") {
             std::printf("attach hr=0x%08lx\n", session->AttachLong(text.Get(), std::atol(second.c_str())));
         } else if (verb == "read") {
-            LONG value = 0;
-            HRESULT result = session->GetLong(text.Get(), &value);
-            std::printf("read hr=0x%08lx value=%ld\n", result, value);
+            result = session->GetLong(text.Get(), &number);
+            std::printf("read hr=0x%08lx value=%ld\n", result, number);
         } else if (verb == "lock") {
             if (first == "unique") manager->GetUniqueKeyName(text.Put());
             std::printf("lock %s hr=0x%08lx\n", second.c_str(), session->LockSession(text.Get(), std::atof(second.c_str()), 0));
@@ -76,21 +77,16 @@ struct Client {
             std::printf("unlock hr=0x%08lx\n", session->UnlockSession());
         } else if (verb == "break") {
             // A lock left by a process that has gone: any client may unwind it, level by level.
-            UniqueBstr owner;
-            LONG level = 0;
-            session->GetLockState(owner.Put(), &level);
-            for (LONG unwound = 0; unwound < level; ++unwound) session->UnlockSession();
-            std::printf("break owner=%s levels=%ld\n", Text(owner.Get()).c_str(), level);
-        } else if (verb == "sessions") {
-            UniqueSafeArray list;
-            HRESULT result = manager->GetSessions(text.Get(), list.Put());
-            LONG upper = -1;
-            if (list) ::SafeArrayGetUBound(list.Get(), 1, &upper);
-            std::printf("sessions %s hr=0x%08lx count=%ld\n", argument.c_str(), result, upper + 1);
+            session->GetLockState(out.Put(), &number);
+            for (LONG unwound = 0; unwound < number; ++unwound) session->UnlockSession();
+            std::printf("break owner=%s levels=%ld\n", Text(out.Get()).c_str(), number);
+        } else if (UniqueSafeArray list; verb == "sessions") {
+            result = manager->GetSessions(text.Get(), list.Put());
+            if (list) ::SafeArrayGetUBound(list.Get(), 1, &count);
+            std::printf("sessions %s hr=0x%08lx count=%ld\n", argument.c_str(), result, count + 1);
         } else if (verb == "describe") {
-            UniqueBstr state;
-            HRESULT result = manager->get_StateDescription(state.Put());
-            std::string all = Text(state.Get());
+            result = manager->get_StateDescription(out.Put());
+            std::string all = Text(out.Get());
             std::size_t local = all.find("In Process State:\n"), external = all.find("Out of Process State:\n");
             std::printf("describe hr=0x%08lx local=%d externalAfterLocal=%d names=%d\n", result, local != std::string::npos,
                         external != std::string::npos && external > local, all.find(argument, external) != std::string::npos);
@@ -98,24 +94,19 @@ struct Client {
             // The external manager's own view, reached as the manager reaches it.
             manager->put_AudibleLifeTimeAlerts(argument == "1" ? VARIANT_TRUE : VARIANT_FALSE);
             ComPtr<IUnknown> created;
-            VARIANT_BOOL value = VARIANT_FALSE;
             Server()->CreateObjectInServer(Bstr("{7D4A10B1-2C88-4E21-B3F6-91E5A07D2C3B}").Get(),
                                            Bstr("{7D4A10B0-2C88-4E21-B3F6-91E5A07D2C3B}").Get(), created.Put());
-            HRESULT result = created.As<IInstrSessionMgr>()->get_AudibleLifeTimeAlerts(&value);
-            std::printf("alerts hr=0x%08lx external=%d\n", result, value);
+            result = created.As<IInstrSessionMgr>()->get_AudibleLifeTimeAlerts(&flag);
+            std::printf("alerts hr=0x%08lx external=%d\n", result, flag);
         } else if (verb == "server") {
-            LONG processId = 0, clients = 0;
             auto server = Server();
-            server->get_ProcessId(&processId);
-            server->get_ClientProcessCount(&clients);
-            std::printf("server pid=%ld clients=%ld\n", processId, clients);
+            server->get_ProcessId(&number);
+            server->get_ClientProcessCount(&count);
+            std::printf("server pid=%ld clients=%ld\n", number, count);
         } else if (verb == "foreign") {
-            // A class that is not ours, early-bound and then late-bound (DISPID 7).
+            // A class that is not ours, late-bound (DISPID 7): Wine carries the server's error text only in EXCEPINFO.
             auto server = Server();
             auto foreign = Bstr("{00020424-0000-0000-C000-000000000046}"), iid = Bstr("{00000000-0000-0000-C000-000000000046}");
-            ComPtr<IUnknown> object;
-            HRESULT early = server->CreateObjectInServer(foreign.Get(), iid.Get(), object.Put());
-            std::printf("foreign vtable hr=0x%08lx desc=%s\n", early, Description().c_str());
             VARIANT arguments[2] = {};  // last argument first
             arguments[0].vt = arguments[1].vt = VT_BSTR;
             arguments[0].bstrVal = iid.Get();

@@ -1,4 +1,4 @@
-// The INI round-trip rule, shared by the fuzz target, the corpus replay and the INI tests: a document
+// The INI round-trip rule, shared by the fuzz target (and its corpus replay) and the INI tests: a document
 // read from any text and written must read back with the same sections, items, names and values (a
 // quoted value stays quoted), and a second write-read must give the very same document. A document
 // the writer cannot carry faithfully must be refused with the writer's own codes, never written wrongly.

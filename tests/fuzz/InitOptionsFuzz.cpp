@@ -1,8 +1,7 @@
 // libFuzzer target for the init-option rules: taking an option out of an option string removes one
-// contiguous run that starts with the option name and holds "=" and the value, and nothing else;
-// a refusal leaves the string alone; the boolean reading answers or raises its one message.
-//
-// Input: the mode byte (bit 0: double-byte code page 932), the option name, a NUL, the options.
+// run that starts with the option name and holds "=" and the value, and nothing else; a refusal
+// leaves the string alone; the boolean reading answers or raises its one message. Input: the mode
+// byte (bit 0: double-byte code page 932), the option name, a NUL, the options.
 #include <cstddef>
 #include <cstdint>
 #include <string>

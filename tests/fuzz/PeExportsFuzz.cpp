@@ -1,16 +1,9 @@
-// libFuzzer target for the export-name reader; the rule is in PeExportsRule.h, which the corpus
-// replay of the normal test run shares.
-#include <cstdint>
-#include <cstdio>
-#include <cstdlib>
-
+// libFuzzer target for the export-name reader; the rule is in PeExportsRule.h.
+#include "FuzzCheck.h"
 #include "PeExportsRule.h"
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     std::string broken = sm::testing::ExportNamesRuleBroken({reinterpret_cast<const char*>(data), size});
-    if (!broken.empty()) {
-        std::fprintf(stderr, "PeExportsFuzz: %s\n", broken.c_str());
-        std::abort();
-    }
+    if (!broken.empty()) sm::fuzz::Fail("PeExportsFuzz", broken.c_str());
     return 0;
 }

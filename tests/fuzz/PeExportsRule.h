@@ -1,4 +1,4 @@
-// The export-name reader's rule over arbitrary bytes, shared by the fuzz target and the corpus replay:
+// The export-name reader's rule over arbitrary bytes, checked by the fuzz target and its corpus replay:
 // either sorted, unique names that start with a letter or "_", or a refusal with TE_BAD_FILE_FORMAT.
 #pragma once
 

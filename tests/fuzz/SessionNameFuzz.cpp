@@ -1,8 +1,6 @@
-// libFuzzer target for the name syntax: the category separator (where it is, how long it is, that
-// it lies inside the text) and the external-process prefixes (what is recognised, that stripping
-// removes exactly the prefix, that adding then stripping gives the text back).
-//
-// The first input byte picks the code page (bit 0: double-byte 932); the rest is the name.
+// libFuzzer target for the name syntax: the category separator (where, how long, inside the text)
+// and the external-process prefixes (recognised, stripped exactly, added then stripped gives the text
+// back). The first input byte picks the code page (bit 0: double-byte 932); the rest is the name.
 #include <cstddef>
 #include <cstdint>
 #include <string>

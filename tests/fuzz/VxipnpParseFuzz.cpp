@@ -1,9 +1,7 @@
 // libFuzzer target for the configuration-file rules: any INI text either gives lists that keep the
 // rules of a virtual instrument (resource set, its own name first, logical names that point at it,
-// found again by name) or is refused with the invalid-boolean or invalid-path error, and parsing
-// the same document twice gives the same lists.
-//
-// The first input byte picks the code page (bit 0: double-byte 932); the rest is the INI text.
+// found again by name) or is refused with the invalid-boolean or invalid-path error, and parsing it
+// twice gives the same lists. The first input byte picks the code page (bit 0: 932); the rest is text.
 #include <cstddef>
 #include <cstdint>
 #include <string>
