@@ -26,11 +26,14 @@ using namespace sm;
 
 namespace {
 
-// The names the workers share; a category that this build can open adds its names here.
-const std::vector<const wchar_t*> names = {L"CUSTOM::Bench", L"CUSTOM::Scope", L"custom/Dmm", L"CUSTOM::Psu"};
+// The names the workers share: every category, on the demo bench (sim/simsetup.ini through
+// SM_SIM_SETUP, the VXIplug&play directory C:\VXIPNP through VXIPNPPATH; ctest sets both).
+const std::vector<const wchar_t*> names = {L"CUSTOM::Bench", L"custom/Dmm", L"VISA::GPIB0::14::INSTR", L"VXIPNP::DMM1",
+                                           L"IVI::MyDmm", L"RQ::DmmToDut"};
 
-enum Operation : int { GetSession, ReleaseSession, Items, LockUnlock, Listings, Rename, OperationCount };
-const char* const operationNames[] = {"GetInstrSession", "Release", "Attach/Detach", "Lock/Unlock", "Listings and state", "put_Name"};
+enum Operation : int { GetSession, ReleaseSession, Items, LockUnlock, Listings, Rename, Driver, OperationCount };
+const char* const operationNames[] = {"GetInstrSession", "Release", "Attach/Detach", "Lock/Unlock", "Listings and state", "put_Name",
+                                      "GetHandleEx/Close"};
 
 std::atomic<bool> stopping{false};
 std::atomic<std::uint64_t> failures{0};
@@ -100,7 +103,20 @@ private:
             case Rename:
                 for (Held& entry : held)
                     if (entry.owned) return void(Check(entry.session->put_Name(Bstr(L"Renamed" + std::to_wstring(Pick(4))).Get()), "put_Name"));
+                return;
+            case Driver: return OpenOrCloseDriver();
         }
+    }
+
+    // Opens the driver session (a custom session has none: E_NOTIMPL) or closes it while other
+    // workers use the same session.
+    void OpenOrCloseDriver() {
+        IInstrSession* session = AnySession();
+        if (!session || Pick(3) == 0) return void(session && Check(session->Close(), "Close"));
+        VARIANT handle;
+        ::VariantInit(&handle);
+        HRESULT opened = session->GetHandleEx(DefaultInterface, &handle);
+        Check(opened == E_NOTIMPL ? S_OK : opened, "GetHandleEx");
     }
 
     // Item IDs carry the worker's index, so no other worker touches them: every call must succeed.
@@ -143,11 +159,11 @@ private:
     }
 
     void ListAndDescribe() {
-        static const wchar_t* const categories[] = {L"", L"?", L"CUSTOM"};
+        static const wchar_t* const categories[] = {L"", L"?", L"CUSTOM", L"VISA", L"VXIPNP", L"IVI"};
         UniqueSafeArray list;
         UniqueBstr text;
-        Check(manager->GetNames(Bstr(categories[Pick(3)]).Get(), static_cast<GetNamesOptions>(Pick(64)), Bstr(L"").Get(), list.Put()), "GetNames");
-        Check(manager->GetSessions(Bstr(categories[Pick(3)]).Get(), list.Put()), "GetSessions");
+        Check(manager->GetNames(Bstr(categories[Pick(6)]).Get(), static_cast<GetNamesOptions>(Pick(64)), Bstr(L"").Get(), list.Put()), "GetNames");
+        Check(manager->GetSessions(Bstr(categories[Pick(6)]).Get(), list.Put()), "GetSessions");
         Check(manager->GetCategories(Bstr(L"").Get(), list.Put()), "GetCategories");
         Check(manager->get_StateDescription(text.Put()), "manager StateDescription");
         if (IInstrSession* session = AnySession()) Check(session->get_StateDescription(text.Put()), "session StateDescription");
