@@ -4,6 +4,7 @@
 #include "ComTestSupport.h"
 
 #include <string>
+#include <utility>
 #include <vector>
 #include "com/Interfaces.h"
 
@@ -40,6 +41,29 @@ inline std::string CategoryOf(IInstrSession* session) {
     UniqueBstr category;
     EXPECT_EQ(session->get_Category(category.Put()), S_OK);
     return Text(category.Get());
+}
+
+// A call as a client sees it: the HRESULT and the error text it left (empty without error info).
+using Answer = std::pair<unsigned long, std::string>;
+inline Answer AnswerOf(HRESULT result) { return {static_cast<unsigned long>(result), TakeErrorInfo().description}; }
+
+template <class Object>
+std::string StateOf(Object* object) {
+    UniqueBstr text;
+    EXPECT_EQ(object->get_StateDescription(text.Put()), S_OK) << TakeErrorInfo().description;
+    return Text(text.Get());
+}
+
+inline LONG LongOf(IInstrSession* session, const wchar_t* id) {
+    LONG value = 0;
+    EXPECT_EQ(session->GetLong(Bstr(id).Get(), &value), S_OK) << TakeErrorInfo().description;
+    return value;
+}
+
+inline bool IsInitializedOf(IInstrSession* session) {
+    VARIANT_BOOL initialized = VARIANT_FALSE;
+    EXPECT_EQ(session->IsInitialized(&initialized), S_OK);
+    return initialized == VARIANT_TRUE;
 }
 
 // GetNames and GetCategories as texts; fail the test on an error.

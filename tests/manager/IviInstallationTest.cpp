@@ -33,26 +33,20 @@ TEST(IviInstallation, WithoutTheLibraryEveryIviListingFailsNamingItsPath) {
     auto manager = CreateManager();
     LibraryHidden hidden("iviconfig.dll");
     ASSERT_TRUE(hidden.hidden) << "is the IVI stand-in installed (sm_install_sim)?";
-    auto all = Bstr(L""), ivi = Bstr(L"IVI");
     UniqueSafeArray names;
-    EXPECT_EQ(static_cast<unsigned long>(manager->GetNames(all.Get(), ReturnVirtualInstruments, all.Get(), names.Put())),
-              0xFFFFBD94);
-    EXPECT_EQ(TakeErrorInfo().description.rfind("Could not load DLL or external library '" + hidden.path +
-                                                    "'.\nWin32 Error Code = '126'\n",
-                                                0),
-              0u);
-    EXPECT_EQ(static_cast<unsigned long>(manager->GetCategories(ivi.Get(), names.Put())), 0xFFFFBD94);
+    auto [code, message] = AnswerOf(manager->GetNames(Bstr(L"").Get(), ReturnVirtualInstruments, Bstr(L"").Get(), names.Put()));
+    EXPECT_EQ(code, 0xFFFFBD94);
+    EXPECT_EQ(message.rfind("Could not load DLL or external library '" + hidden.path + "'.\nWin32 Error Code = '126'\n", 0), 0u);
+    EXPECT_EQ(static_cast<unsigned long>(manager->GetCategories(Bstr(L"IVI").Get(), names.Put())), 0xFFFFBD94);
 }
 
 TEST(IviInstallation, AStoreThatCannotBeOpenedIsReportedAndTriedAgain) {
     WriteSetup(Store("OpenFails = 1\n"));
     auto manager = CreateManager();
-    auto ivi = Bstr(L"IVI");
     UniqueSafeArray names;
-    EXPECT_EQ(static_cast<unsigned long>(manager->GetCategories(ivi.Get(), names.Put())), 0xFFFFBBA3);
-    EXPECT_EQ(TakeErrorInfo().description,
-              "The Quillvane Dovekit may not be installed. The installer for the Dovekit is located on the Quillvane "
-              "Driver CD-ROM.\n");
+    EXPECT_EQ(AnswerOf(manager->GetCategories(Bstr(L"IVI").Get(), names.Put())),
+              Answer(0xFFFFBBA3, "The Quillvane Dovekit may not be installed. The installer for the Dovekit is located "
+                                 "on the Quillvane Driver CD-ROM.\n"));
     WriteSetup(Store());
     EXPECT_EQ(ListCategories(manager.Get(), L"IVI"), (Texts{"IviDmm", "IviScope"}));
 }

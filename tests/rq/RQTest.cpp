@@ -137,16 +137,15 @@ TEST_F(SwitchSession, RefusesClassDriverLongHandlesComDriversOtherProcessesAndFa
     LONG shortHandle = 1;
     ComPtr<IUnknown> driver;
     EXPECT_EQ(session->GetHandleEx(ClassDriver, handle.Get()), Code(TE_INVALID_OR_OUT_OF_RANGE));
-    EXPECT_EQ(session->GetHandle(DefaultInterface, &shortHandle), Code(TE_INVALID_POINTER));
-    EXPECT_EQ(TakeErrorInfo().description, "32-bit pointer used with 64-bit platform.");
+    EXPECT_EQ(AnswerOf(session->GetHandle(DefaultInterface, &shortHandle)),
+              Answer(Code(TE_INVALID_POINTER), "32-bit pointer used with 64-bit platform."));
     EXPECT_EQ(session->GetCOMDriver(DefaultInterface, driver.Put()), Code(TE_OPERATION_FAILED));
     ASSERT_EQ(session->put_InExternalProcess(VARIANT_TRUE), S_OK);
-    EXPECT_EQ(session->GetHandleEx(DefaultInterface, handle.Get()), Code(TE_OPERATION_FAILED));
-    EXPECT_EQ(TakeErrorInfo().description,
-              "RQ instrument handles cannot be used outside of the operating system process that they are created in.");
+    EXPECT_EQ(AnswerOf(session->GetHandleEx(DefaultInterface, handle.Get())),
+              Answer(Code(TE_OPERATION_FAILED), "RQ instrument handles cannot be used outside of the operating system "
+                                                "process that they are created in."));
     auto broken = GetSession(CreateManager().Get(), L"RQ::BrokenRoute", true);
-    EXPECT_EQ(broken->Initialize(Bstr(L"").Get()), Code(-1));
-    EXPECT_EQ(TakeErrorInfo().description, "BrokenRoute_init returned an error: -1 (0xffffffff).");
+    EXPECT_EQ(AnswerOf(broken->Initialize(Bstr(L"").Get())), Answer(Code(-1), "BrokenRoute_init returned an error: -1 (0xffffffff)."));
 }
 
 // Catches a session left open by Close or by the last release, or the library left loaded.

@@ -2,7 +2,8 @@
 // scripts cannot read under Wine: array results and [out] parameters that are not the return value
 // (Wine's VBScript cannot read SAFEARRAY(BSTR) or SAFEARRAY(IDispatch) results, passes [out]
 // arguments as references to VARIANT that the type-library dispatch refuses, and JScript passes none).
-// One test per kind of member; the decisions behind them are tested early-bound.
+// One test per kind of member; the decisions behind them are tested early-bound, and an error
+// through EXCEPINFO with the COM frame's tests.
 #include <gtest/gtest.h>
 
 #include <string>
@@ -43,12 +44,6 @@ TEST_F(LateBound, TextArraysArriveAsArraysOfBstr) {
     ASSERT_EQ(categories.result, S_OK) << categories.description;
     ASSERT_EQ(categories.value->vt, VT_ARRAY | VT_BSTR);
     EXPECT_EQ(ReadTexts(categories.value->parray), (std::vector<std::string>{"IVI", "VISA", "VXIPNP", "CUSTOM"}));
-    // A failing array member leaves no array behind (Wine may still tag the VARIANT with the array type).
-    LateResult failed = Invoke(manager.Get(), L"GetNames", DISPATCH_METHOD, Arguments().Text(L"FOO").Long(3).Text(L""));
-    EXPECT_EQ(failed.result, DISP_E_EXCEPTION);
-    EXPECT_EQ(failed.code, unrecognizedValue);
-    EXPECT_EQ(failed.description, "'FOO' is not a driver session category");
-    EXPECT_TRUE(failed.value->vt == VT_EMPTY || failed.value->parray == nullptr);
 }
 
 TEST_F(LateBound, SessionArraysHoldDispatchPointersWithTheirOwnReferences) {
@@ -75,11 +70,8 @@ TEST_F(LateBound, OutParametersCarryTheKeyAndTheLockState) {
     for (const wchar_t* owner : {L"Station", L"STATION"})
         ASSERT_EQ(Invoke(session.Get(), L"LockSession", DISPATCH_METHOD, Arguments().Text(owner).Double(0).Long(0)).result,
                   S_OK);
-    UniqueBstr ownerKey;
+    UniqueBstr owner;
     LONG level = -1;
-    ASSERT_EQ(Invoke(session.Get(), L"GetLockState", DISPATCH_METHOD, Arguments().TextOut(ownerKey.Put()).LongOut(&level))
-                  .result,
-              S_OK);
-    EXPECT_EQ(Text(ownerKey.Get()), "Station");
-    EXPECT_EQ(level, 2);
+    ASSERT_EQ(Invoke(session.Get(), L"GetLockState", DISPATCH_METHOD, Arguments().TextOut(owner.Put()).LongOut(&level)).result, S_OK);
+    EXPECT_EQ(Text(owner.Get()) + " " + std::to_string(level), "Station 2");
 }

@@ -20,8 +20,6 @@ const bool benchReady = [] {
 }();
 
 long Count(const char* counter) { return SimCount("visa32.dll", counter); }
-// A failing call as the client sees it.
-std::pair<HRESULT, std::string> Failure(HRESULT result) { return {result, TakeErrorInfo().description}; }
 
 struct VisaSession : ::testing::Test {
     ComPtr<IInstrSessionMgr> manager = CreateManager();
@@ -33,9 +31,7 @@ struct VisaSession : ::testing::Test {
 TEST_F(VisaSession, ModulesShareOneHandleOpenedOnce) {
     auto names = ListNames(manager.Get(), L"VISA", ReturnLogicalNames | IncludeCategoryPrefix);
     EXPECT_EQ(names, std::vector<std::string>{"VISA::DMM"});
-    UniqueBstr state;
-    ASSERT_EQ(manager->get_StateDescription(state.Put()), S_OK);
-    EXPECT_NE(Text(state.Get()).find("VISA Configuration:\n   Number of resources = 3\n"), std::string::npos);
+    EXPECT_NE(StateOf(manager.Get()).find("VISA Configuration:\n   Number of resources = 3\n"), std::string::npos);
     auto first = GetSession(manager.Get(), L"visa::DMM"), second = GetSession(manager.Get(), L"VISA::dmm");
     ASSERT_EQ(first.Get(), second.Get());
     long opened = Count("viOpen");
@@ -45,9 +41,8 @@ TEST_F(VisaSession, ModulesShareOneHandleOpenedOnce) {
     EXPECT_EQ(handle, 0);
     UniqueVariant shared;
     ASSERT_EQ(second->GetHandleEx(IODriver, shared.Get()), S_OK);
-    EXPECT_EQ(shared->vt, VT_I4);
     EXPECT_EQ(first->GetHandle(DefaultInterface, &handle), S_OK);
-    EXPECT_EQ(handle, shared->lVal);
+    EXPECT_EQ(std::make_pair(shared->vt, shared->lVal), std::make_pair(VARTYPE(VT_I4), handle));
     EXPECT_EQ(Count("viOpen") - opened, 1);
 }
 
@@ -72,17 +67,16 @@ TEST_F(VisaSession, CloseClosesTheInstrumentThenItsResourceManager) {
 // handle it opened, and a handle handed out of the process it belongs to.
 TEST_F(VisaSession, HandlesThatCannotBeUsedAreRefusedWithTheReason) {
     auto missing = GetSession(manager.Get(), L"VISA::ASRL9::INSTR"), silent = GetSession(manager.Get(), L"VISA::ASRL8::INSTR");
-    EXPECT_EQ(Failure(missing->Initialize(nullptr)),
-              std::make_pair(HRESULT(0xBFFF0011), std::string("viOpen returned -1073807343. Description: 'The simulated "
-                                                              "bench has no such resource.'.")));
+    EXPECT_EQ(AnswerOf(missing->Initialize(nullptr)),
+              Answer(0xBFFF0011, "viOpen returned -1073807343. Description: 'The simulated bench has no such resource.'."));
     long closed = Count("viClose");
     UniqueVariant handle;
-    EXPECT_EQ(Failure(silent->GetHandleEx(DefaultInterface, handle.Get())),
-              std::make_pair(HRESULT(TE_OPERATION_FAILED), std::string("viOpen returned 1073676413. Description: 'The "
-                                                                       "session opened, but the simulated device does not answer.'.")));
+    EXPECT_EQ(AnswerOf(silent->GetHandleEx(DefaultInterface, handle.Get())),
+              Answer(operationFailed, "viOpen returned 1073676413. Description: 'The session opened, but the simulated "
+                                      "device does not answer.'."));
     EXPECT_EQ(Count("viClose") - closed, 1);
     ASSERT_EQ(missing->put_InExternalProcess(VARIANT_TRUE), S_OK);
-    EXPECT_EQ(Failure(missing->GetHandleEx(IODriver, handle.Get())),
-              std::make_pair(HRESULT(TE_OPERATION_FAILED), std::string("VISA instrument handles cannot be used outside "
-                                                                       "of the operating system process that they are created in.")));
+    EXPECT_EQ(AnswerOf(missing->GetHandleEx(IODriver, handle.Get())),
+              Answer(operationFailed, "VISA instrument handles cannot be used outside of the operating system process "
+                                      "that they are created in."));
 }

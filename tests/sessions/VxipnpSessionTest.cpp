@@ -60,11 +60,6 @@ protected:
         manager = CreateManager();
     }
     long Count(const char* name) { return GetProcAddressAs<long(const char*)>(pinned.Get(), "SimCounter")(name); }
-    std::string State(IInstrSession* session) {
-        UniqueBstr text;
-        EXPECT_EQ(session->get_StateDescription(text.Put()), S_OK);
-        return Text(text.Get());
-    }
     static void ExpectError(HRESULT result, unsigned long code, const std::string& description) {
         ExpectComError(result, code, description, CLSID_VXIPNPInstrSession);
     }
@@ -77,8 +72,7 @@ TEST_F(VxipnpSession, LogicalAndInstrumentNameGiveOneSessionInitializedOnce) {
     auto byInstrument = GetSession(manager.Get(), L"VXIPNP::BenchDMM");
     EXPECT_EQ(byLogicalName.Get(), byInstrument.Get());  // HasName must look at every name of the instrument
     ASSERT_EQ(byLogicalName->Initialize(nullptr), S_OK);
-    auto options = Bstr(L"Reset=1");
-    ASSERT_EQ(byInstrument->Initialize(options.Get()), S_OK);
+    ASSERT_EQ(byInstrument->Initialize(Bstr(L"Reset=1").Get()), S_OK);
     EXPECT_EQ(Count("init"), 1);
     EXPECT_EQ(Count("init idquery"), 1);  // ID query and reset come from the file, not from the options
     EXPECT_EQ(Count("init reset"), 0);
@@ -93,8 +87,7 @@ TEST_F(VxipnpSession, HandleLevelsAndReinitAfterClose) {
     }
     UniqueVariant handleEx;
     ASSERT_EQ(session->GetHandleEx(IODriver, handleEx.Get()), S_OK);
-    EXPECT_EQ(handleEx->vt, VT_I4);
-    EXPECT_EQ(handleEx->lVal, 0x1401);
+    EXPECT_EQ(std::make_pair(handleEx->vt, handleEx->lVal), std::make_pair(VARTYPE(VT_I4), 0x1401L));
     LONG handle = 5;
     ExpectError(session->GetHandle(ClassDriver, &handle), 0xFFFFBC6C, "Value invalid or out of range.");
     EXPECT_EQ(session->GetHandle(static_cast<InterfaceLevel>(7), &handle), S_OK);
@@ -103,7 +96,7 @@ TEST_F(VxipnpSession, HandleLevelsAndReinitAfterClose) {
 
     ASSERT_EQ(session->Close(), S_OK);
     EXPECT_EQ(Count("close"), 1);
-    EXPECT_NE(State(session.Get()).find("      Initialized: False, Loaded: True, In Process, Module Path: " + simdmmPath),
+    EXPECT_NE(StateOf(session.Get()).find("      Initialized: False, Loaded: True, In Process, Module Path: " + simdmmPath),
               std::string::npos);
     ASSERT_EQ(session->GetHandle(DefaultInterface, &handle), S_OK);
     EXPECT_EQ(handle, 0x1401);
@@ -113,38 +106,34 @@ TEST_F(VxipnpSession, HandleLevelsAndReinitAfterClose) {
 TEST_F(VxipnpSession, WarningOpensFailureRaisesItsStatusAndKeepsTheDriverLoaded) {
     auto warned = GetSession(manager.Get(), L"VXIPNP::WarnDMM");
     EXPECT_EQ(warned->Initialize(nullptr), S_OK);
-    VARIANT_BOOL initialized = VARIANT_FALSE;
-    warned->IsInitialized(&initialized);
-    EXPECT_EQ(initialized, VARIANT_TRUE);
+    EXPECT_TRUE(IsInitializedOf(warned.Get()));
 
     auto absent = GetSession(manager.Get(), L"VXIPNP::AbsentDMM");
     ExpectError(absent->Initialize(nullptr), resourceNotFound, "simdmm_init returned an error: -1073807343 (0xbfff0011).");
-    EXPECT_NE(State(absent.Get()).find("Initialized: False, Loaded: True"), std::string::npos);
+    EXPECT_NE(StateOf(absent.Get()).find("Initialized: False, Loaded: True"), std::string::npos);
 }
 
 TEST_F(VxipnpSession, LibraryFailuresAreReportedAndLeaveNothingLoaded) {
     auto missing = GetSession(manager.Get(), L"VXIPNP::Missing");
-    EXPECT_EQ(static_cast<unsigned long>(missing->Initialize(nullptr)), 0xFFFFBD94);
-    std::string message = TakeErrorInfo().description;
+    auto [code, message] = AnswerOf(missing->Initialize(nullptr));
+    EXPECT_EQ(code, 0xFFFFBD94);
     EXPECT_EQ(message.rfind("Could not load DLL or external library '" + bin + "\\absent_64.dll'.\nWin32 Error Code = '126'\n", 0),
-              0u)
-        << message;
+              0u) << message;
 
     auto noClose = GetSession(manager.Get(), L"VXIPNP::NoClose");
     ExpectError(noClose->Initialize(nullptr), 0xFFFFBD93,
                 "Could not find function 'simnoclose_close' in DLL (or external module) '" + bin + "\\simnoclose_64.dll'.");
-    EXPECT_NE(State(noClose.Get()).find("Initialized: False, Loaded: False"), std::string::npos);
+    EXPECT_NE(StateOf(noClose.Get()).find("Initialized: False, Loaded: False"), std::string::npos);
     EXPECT_EQ(::GetModuleHandleA("simnoclose_64.dll"), nullptr);
 }
 
 // A failed load has opened nothing: the callers' release-on-close items must survive it.
 TEST_F(VxipnpSession, FailedLoadKeepsReleaseOnCloseItems) {
     auto missing = GetSession(manager.Get(), L"VXIPNP::Missing");
-    auto id = Bstr(L"Kept"), clsid = Bstr(L"");
-    ASSERT_EQ(missing->AttachObject(id.Get(), manager.Get(), clsid.Get(), VARIANT_TRUE), S_OK);
+    ASSERT_EQ(missing->AttachObject(Bstr(L"Kept").Get(), manager.Get(), Bstr(L"").Get(), VARIANT_TRUE), S_OK);
     EXPECT_NE(missing->Initialize(nullptr), S_OK);
     ComPtr<IUnknown> kept;
-    EXPECT_EQ(missing->GetObject(id.Get(), kept.Put()), S_OK);
+    EXPECT_EQ(missing->GetObject(Bstr(L"Kept").Get(), kept.Put()), S_OK);
     EXPECT_TRUE(kept);
 }
 
@@ -177,9 +166,7 @@ TEST_F(VxipnpSession, StandardFunctionsAnswerWithTheDriversResults) {
     LONG code = 0, status = 0;
     UniqueBstr text, firmware;
     EXPECT_EQ(first->Error_Query(&code, text.Put(), &status), S_OK);  // a negative status is a result
-    EXPECT_EQ(code, -113);
-    EXPECT_EQ(Text(text.Get()), "Undefined header");
-    EXPECT_EQ(status, -5);
+    EXPECT_EQ(std::to_string(code) + " " + Text(text.Get()) + " " + std::to_string(status), "-113 Undefined header -5");
     EXPECT_EQ(second->Error_Query(&code, text.Put(), &status), S_OK);
     EXPECT_EQ(Count("error_query"), 2);
     EXPECT_EQ(Count("init"), 1);
@@ -191,8 +178,7 @@ TEST_F(VxipnpSession, StandardFunctionsAnswerWithTheDriversResults) {
     EXPECT_EQ(status, 0x3FFF0085);
     short result = 0;
     EXPECT_EQ(first->Self_Test(&result, text.Put(), &status), S_OK);
-    EXPECT_EQ(result, -3);
-    EXPECT_EQ(Text(text.Get()), "Input relay stuck");
+    EXPECT_EQ(std::to_string(result) + " " + Text(text.Get()), "-3 Input relay stuck");
     EXPECT_EQ(static_cast<unsigned long>(status), 0xBFFC0800);
     EXPECT_EQ(first->Revision_Query(text.Put(), firmware.Put(), &status), S_OK);
     EXPECT_EQ(Text(text.Get()) + "/" + Text(firmware.Get()), "drv 1.2/fw 7");
