@@ -305,17 +305,6 @@ TEST(IniValues, PathsDecodeOnlyBackslashAndQuoteAndAreNeverCut) {
     EXPECT_EQ(path.View(), "C:\\Program Files\\fl45_64.dll");
 }
 
-TEST(IniValues, EngineErrorsMapToTECodesAndMessages) {
-    for (auto [engine, code] : {std::pair<std::int32_t, std::int32_t>{InvalidBooleanValue, TE_INVALID_OR_OUT_OF_RANGE},
-                                {UnRecognizedValue, TE_UNRECOGNIZED_VALUE}, {OperationInProgress, TE_OPERATION_IN_PROGRESS},
-                                {DiskFull, TE_DISK_FULL}, {-4999, TE_OPERATION_FAILED}})
-        EXPECT_EQ(IniErrorToTECode(engine), code) << engine;
-    EXPECT_EQ(GetIniErrorMessage(-4999), "No description available. ");
-    ExpectTE([] { RaiseIniError("VxipnpInfo::Parse", InvalidBooleanValue); }, TE_INVALID_OR_OUT_OF_RANGE,
-             "Invalid Boolean Value", "VxipnpInfo::Parse");
-    EXPECT_EQ(CatchTE([] { RaiseIniError("VxipnpInfo::Parse", InvalidBooleanValue); }).GetApiErrorCode(), -5024);
-}
-
 // ---- Files ---------------------------------------------------------------------------------------
 
 // Catches a reader that opens for writing (the file is read-only), touches the file, or loses lines at blocks.

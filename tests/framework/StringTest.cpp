@@ -78,21 +78,6 @@ TEST(DynamicStringSharing, NewStringsStartOnTheGlobalEmptyBufferAndSelfEditsAreS
     EXPECT_STREQ(text.GetText(), "bc");
 }
 
-// Catches a reallocation at every append and a capacity without room for the terminator.
-TEST(DynamicStringGrowth, GrowsByAThirtySecondPlusFourRoundedToFour) {
-    DynamicString text("x");
-    std::size_t capacity = text.GetCapacity();
-    int growths = 0;
-    for (int i = 0; i < 1000; ++i) {
-        if (text.Append("y").GetCapacity() == capacity) continue;
-        capacity = text.GetCapacity();
-        ++growths;
-        EXPECT_EQ((capacity + 1) % 4, 0u);
-    }
-    EXPECT_LT(growths, 100);
-    EXPECT_EQ(text.Size(), 1001u);
-}
-
 TEST(StringCompare, CaseRulesAndCountedForms) {
     DynamicString text("IdQuery=1");
     EXPECT_EQ(text.Compare("idquery=1", true), 0);
