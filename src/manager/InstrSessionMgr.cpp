@@ -69,22 +69,31 @@ bool CInstrSessionMgr::IsVisibleCategoryName(std::string_view text) const {
 }
 
 void CInstrSessionMgr::SplitSessionName(std::string_view text, String& category, String& name) const {
+    std::string_view categoryPart, namePart;
+    SplitSessionName(text, categoryPart, namePart);
+    category.Assign(categoryPart);
+    name.Assign(namePart);
+}
+
+// The parts are views into text (or AnyCategory): a lookup splits a name without copying it.
+void CInstrSessionMgr::SplitSessionName(std::string_view text, std::string_view& category,
+                                        std::string_view& name) const {
     std::size_t position = 0, length = 0;
     if (!FindCategorySeparator(text, &position, &length)) {
-        name.Assign(text);
-        category.Assign(AnyCategory);
+        name = text;
+        category = AnyCategory;
         return;
     }
     std::size_t nameStart = multibyte::ByteOffset(text, position + length);
-    DynamicString prefix(text.substr(0, multibyte::ByteOffset(text, position)));
-    if (!IsVisibleCategoryName(prefix.View()) && !IsAnyCategory(prefix.View())) {
+    std::string_view prefix = text.substr(0, multibyte::ByteOffset(text, position));
+    if (!IsVisibleCategoryName(prefix) && !IsAnyCategory(prefix)) {
         // The prefix was no category after all: the whole text is the name.
-        name.Assign(text);
-        category.Assign(AnyCategory);
+        name = text;
+        category = AnyCategory;
         return;
     }
-    category.Assign(prefix);
-    name.Assign(text.substr(nameStart));
+    category = prefix;
+    name = text.substr(nameStart);
 }
 
 void CInstrSessionMgr::SplitCategoryArgument(std::string_view text, String& category, String& subCategory) const {
@@ -110,15 +119,18 @@ STDMETHODIMP CInstrSessionMgr::GetInstrSession(BSTR name, VARIANT_BOOL newSessio
     if (!session) return E_POINTER;
     *session = nullptr;
     return ManagerCall([&]() -> HRESULT {
-        DynamicString text = TrimmedString(name);
-        if (ShouldForward(text.View()))
-            return GetExternalMgr(ExternalProcessIndex(text.View()))->GetInstrSession(name, newSession, session);
-        StripExternalPrefix(text);
-        DynamicString category, sessionName;
-        SplitSessionName(text.View(), category, sessionName);
+        // A hit is the hot path of every test step: the name is taken apart as views of one
+        // converted text, without copies.
+        BstrText converted(name);
+        std::string_view text = multibyte::Trimmed(converted.View());
+        if (ShouldForward(text))
+            return GetExternalMgr(ExternalProcessIndex(text))->GetInstrSession(name, newSession, session);
+        text = WithoutExternalPrefix(text);
+        std::string_view category, sessionName;
+        SplitSessionName(text, category, sessionName);
         ComPtr<IInstrSession> found;
-        if (newSession || !FindExistingSession(category.View(), sessionName.View(), found)) {
-            if (!CreateInstrSession(category.View(), sessionName.View(), found)) {
+        if (newSession || !FindExistingSession(category, sessionName, found)) {
+            if (!CreateInstrSession(category, sessionName, found)) {
                 DynamicString message("'");
                 message.Append(text).Append("' ").Append("is not a driver session name");
                 TE_RAISE(TE_UNRECOGNIZED_VALUE, "CInstrSessionMgr::GetInstrSession", message);

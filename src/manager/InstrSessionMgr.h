@@ -53,6 +53,7 @@ public:
     // Name rules that depend on this manager's hidden categories.
     bool IsVisibleCategoryName(std::string_view text) const;
     void SplitSessionName(std::string_view text, String& category, String& name) const;
+    void SplitSessionName(std::string_view text, std::string_view& category, std::string_view& name) const;
     void SplitCategoryArgument(std::string_view text, String& category, String& subCategory) const;
 
 protected:
