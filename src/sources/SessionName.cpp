@@ -7,7 +7,9 @@ namespace sm {
 bool IsAnyCategory(std::string_view category) { return category.empty() || category == AnyCategory; }
 
 bool SameCategory(std::string_view left, std::string_view right) {
-    return multibyte::Compare(left, right, true) == 0;
+    // Texts that compare equal have equal byte lengths: each character is lowered to one of its
+    // own length.
+    return left.size() == right.size() && multibyte::Compare(left, right, true) == 0;
 }
 
 namespace {
