@@ -28,11 +28,14 @@ CInstrSessionMgr::~CInstrSessionMgr() {
     for (unsigned frequency = 3000; frequency > 1000; frequency -= 200) LifeTimeAlert(frequency, 10);
     // While the process goes away the proxies' channels may already be gone: a release would have
     // to call out to the server and could hang the exit. The server notices the ended process.
-    for (auto& server : externalServer) {
-        if (IsModuleDetaching())
-            server.Detach();
-        else
-            server.Reset();
+    for (int index = 0; index < 2; ++index) {
+        if (IsModuleDetaching()) {
+            externalManager[index].Detach();
+            externalServer[index].Detach();
+        } else {
+            externalManager[index].Reset();
+            externalServer[index].Reset();
+        }
     }
 }
 
@@ -124,7 +127,9 @@ STDMETHODIMP CInstrSessionMgr::GetInstrSession(BSTR name, VARIANT_BOOL newSessio
         BstrText converted(name);
         std::string_view text = multibyte::Trimmed(converted.View());
         if (ShouldForward(text))
-            return GetExternalMgr(ExternalProcessIndex(text))->GetInstrSession(name, newSession, session);
+            return CallExternal(ExternalProcessIndex(text), [&](IInstrSessionMgr* external) {
+                return external->GetInstrSession(name, newSession, session);
+            });
         text = WithoutExternalPrefix(text);
         std::string_view category, sessionName;
         SplitSessionName(text, category, sessionName);
@@ -270,7 +275,8 @@ STDMETHODIMP CInstrSessionMgr::put_AudibleLifeTimeAlerts(VARIANT_BOOL value) {
         SetAudibleLifeTimeAlerts(value != 0);
         if (inExternalProcess) return;
         for (int index = 0; index < 2; ++index)
-            if (externalServer[index]) GetExternalMgr(index)->put_AudibleLifeTimeAlerts(value);
+            if (externalServer[index])
+                CallExternal(index, [&](IInstrSessionMgr* external) { return external->put_AudibleLifeTimeAlerts(value); });
     });
 }
 
@@ -279,7 +285,8 @@ STDMETHODIMP CInstrSessionMgr::InvalidateVisaResourceList() {
         visaInfo.InvalidateResourceList();
         if (inExternalProcess) return;
         for (int index = 0; index < 2; ++index)
-            if (externalServer[index]) GetExternalMgr(index)->InvalidateVisaResourceList();
+            if (externalServer[index])
+                CallExternal(index, [](IInstrSessionMgr* external) { return external->InvalidateVisaResourceList(); });
     });
 }
 

@@ -89,6 +89,18 @@ private:
 
     // The external process managers (index 0: 64-bit, 1: 32-bit).
     ComPtr<IInstrSessionMgr> GetExternalMgr(int index);
+    // Runs call (IInstrSessionMgr* -> HRESULT) on the external manager of index. A manager kept from
+    // an earlier connection whose channel has gone is dropped and the connection is made again, so
+    // that the caller sees what connecting to a vanished server reports.
+    template <class Call>
+    HRESULT CallExternal(int index, Call&& call) {
+        bool kept = static_cast<bool>(externalManager[index]);
+        HRESULT result = call(GetExternalMgr(index).Get());
+        if (!kept || !IsLostConnection(result)) return result;
+        externalManager[index].Reset();
+        return call(GetExternalMgr(index).Get());
+    }
+    static bool IsLostConnection(HRESULT result);
     bool ShouldForward(std::string_view trimmedText) const;
 
     CriticalSection lock;
@@ -105,6 +117,10 @@ private:
     bool customHidden = false;
     bool inExternalProcess = false;
     ComPtr<IUnknown> externalServer[2];
+    // The external manager obtained at the first connection, kept with the server pointer: the
+    // server's manager is a singleton, so asking the server again on every forwarded request (four
+    // cross-process calls) would hand back the same object.
+    ComPtr<IInstrSessionMgr> externalManager[2];
     std::int32_t uniqueKeyCounter = 0;
 };
 

@@ -38,9 +38,27 @@ void RunStage(Stage&& stage, const char* explanation) {
 }
 }  // namespace
 
+bool CInstrSessionMgr::IsLostConnection(HRESULT result) {
+    switch (result) {
+        case RPC_E_DISCONNECTED:
+        case RPC_E_SERVER_DIED:
+        case RPC_E_SERVER_DIED_DNE:
+        case CO_E_OBJNOTCONNECTED:
+        case HRESULT_FROM_WIN32(RPC_S_SERVER_UNAVAILABLE):
+        case HRESULT_FROM_WIN32(RPC_S_CALL_FAILED):
+        case HRESULT_FROM_WIN32(RPC_S_CALL_FAILED_DNE):
+            return true;
+        default:
+            return false;
+    }
+}
+
 ComPtr<IInstrSessionMgr> CInstrSessionMgr::GetExternalMgr(int index) {
     CriticalSectionGuard guard(lock);
     if (inExternalProcess) TE_RAISE(TE_PROGRAM_ERROR, getExternalMgr);
+    // The external flag and the alert setting were given to this manager when it was obtained;
+    // later alert settings reach it through put_AudibleLifeTimeAlerts.
+    if (externalManager[index]) return externalManager[index];
 
     ComPtr<IExternalProcessServer> server;
     RunStage(
@@ -76,6 +94,7 @@ ComPtr<IInstrSessionMgr> CInstrSessionMgr::GetExternalMgr(int index) {
     if (queried != S_OK) throw ComError(FAILED(queried) ? queried : E_NOINTERFACE);
     external->put_InExternalProcess(VARIANT_TRUE);
     external->put_AudibleLifeTimeAlerts(AudibleLifeTimeAlertsEnabled() ? VARIANT_TRUE : VARIANT_FALSE);
+    externalManager[index] = external;
     return external;
 }
 
