@@ -10,6 +10,7 @@
 #include "com/Implements.h"
 #include "com/Interfaces.h"
 #include "com/UniqueHandles.h"
+#include "manager/ExternalConnection.h"
 #include "manager/SessionIndex.h"
 #include "sessions/SessionBase.h"
 #include "sources/IviInfo.h"
@@ -89,18 +90,15 @@ private:
 
     // The external process managers (index 0: 64-bit, 1: 32-bit).
     ComPtr<IInstrSessionMgr> GetExternalMgr(int index);
-    // Runs call (IInstrSessionMgr* -> HRESULT) on the external manager of index. A manager kept from
-    // an earlier connection whose channel has gone is dropped and the connection is made again, so
-    // that the caller sees what connecting to a vanished server reports.
+    // Runs call (IInstrSessionMgr* -> HRESULT) on the external manager of index; see
+    // CallKeptOrReconnect for a kept manager whose server has gone.
     template <class Call>
     HRESULT CallExternal(int index, Call&& call) {
-        bool kept = static_cast<bool>(externalManager[index]);
-        HRESULT result = call(GetExternalMgr(index).Get());
-        if (!kept || !IsLostConnection(result)) return result;
-        externalManager[index].Reset();
-        return call(GetExternalMgr(index).Get());
+        return CallKeptOrReconnect(
+            static_cast<bool>(externalManager[index]), [&] { return GetExternalMgr(index); },
+            [&] { externalManager[index].Reset(); },
+            [&](const ComPtr<IInstrSessionMgr>& external) { return call(external.Get()); });
     }
-    static bool IsLostConnection(HRESULT result);
     bool ShouldForward(std::string_view trimmedText) const;
 
     CriticalSection lock;

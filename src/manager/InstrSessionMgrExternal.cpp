@@ -38,21 +38,6 @@ void RunStage(Stage&& stage, const char* explanation) {
 }
 }  // namespace
 
-bool CInstrSessionMgr::IsLostConnection(HRESULT result) {
-    switch (result) {
-        case RPC_E_DISCONNECTED:
-        case RPC_E_SERVER_DIED:
-        case RPC_E_SERVER_DIED_DNE:
-        case CO_E_OBJNOTCONNECTED:
-        case HRESULT_FROM_WIN32(RPC_S_SERVER_UNAVAILABLE):
-        case HRESULT_FROM_WIN32(RPC_S_CALL_FAILED):
-        case HRESULT_FROM_WIN32(RPC_S_CALL_FAILED_DNE):
-            return true;
-        default:
-            return false;
-    }
-}
-
 ComPtr<IInstrSessionMgr> CInstrSessionMgr::GetExternalMgr(int index) {
     CriticalSectionGuard guard(lock);
     if (inExternalProcess) TE_RAISE(TE_PROGRAM_ERROR, getExternalMgr);
