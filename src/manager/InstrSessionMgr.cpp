@@ -147,9 +147,9 @@ STDMETHODIMP CInstrSessionMgr::GetInstrSession(BSTR name, VARIANT_BOOL newSessio
     });
 }
 
+// The caller holds the manager lock (GetInstrSession, from entry to exit).
 bool CInstrSessionMgr::FindExistingSession(std::string_view category, std::string_view name,
                                            ComPtr<IInstrSession>& found) {
-    CriticalSectionGuard guard(lock);
     // The index gives the session a scan of the table in order would give, without asking each.
     sessionIndex.CatchUp(sessions);
     IInstrSession* session = sessionIndex.Find(category, name);
