@@ -44,6 +44,10 @@ public:
     STDMETHODIMP InvalidateVisaResourceList() override;
     STDMETHODIMP GetUniqueKeyName(BSTR* keyName) override;
 
+    // IDispatch: the plain late-bound GetInstrSession is answered without the type library.
+    STDMETHODIMP Invoke(DISPID member, REFIID iid, LCID locale, WORD flags, DISPPARAMS* parameters, VARIANT* result,
+                        EXCEPINFO* exception, UINT* argumentError) override;
+
     // SessionOwner
     void LockTable() override { lock.Lock(); }
     void UnlockTable() override { lock.Unlock(); }
