@@ -3,7 +3,7 @@
 // under Wine allocates its argument buffers on every call) cost several times the lookup itself.
 // The plain form of a GetInstrSession call, two arguments by value (a string, then a boolean) and no
 // named ones, is unpacked here with the answers the type library's dispatch gives: the session as
-// VT_DISPATCH, or DISP_E_EXCEPTION with the error info in EXCEPINFO. Every other call and form goes
+// VT_DISPATCH, or DISP_E_EXCEPTION with the error info in EXCEPINFO and a null VT_DISPATCH. Every other call and form goes
 // to the type library.
 #include "manager/InstrSessionMgr.h"
 
@@ -27,6 +27,13 @@ STDMETHODIMP CInstrSessionMgr::Invoke(DISPID member, REFIID iid, LCID locale, WO
     // Arguments arrive last first.
     IInstrSession* session = nullptr;
     HRESULT called = GetInstrSession(parameters->rgvarg[1].bstrVal, parameters->rgvarg[0].boolVal, &session);
+    // The result is a VT_DISPATCH also after a failure (then null), as the type library leaves it.
+    if (result) {
+        result->vt = VT_DISPATCH;
+        result->pdispVal = session;
+    } else if (session) {
+        session->Release();
+    }
     if (FAILED(called)) {
         if (exception) {
             exception->scode = called;
@@ -39,12 +46,6 @@ STDMETHODIMP CInstrSessionMgr::Invoke(DISPID member, REFIID iid, LCID locale, WO
             }
         }
         return DISP_E_EXCEPTION;
-    }
-    if (result) {
-        result->vt = VT_DISPATCH;
-        result->pdispVal = session;
-    } else if (session) {
-        session->Release();
     }
     return S_OK;
 }
