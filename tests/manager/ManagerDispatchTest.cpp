@@ -33,9 +33,14 @@ void ExpectSameAnswer(IInstrSessionMgr* manager, const wchar_t* name) {
     EXPECT_EQ(quick.result, typeLibrary.result) << Text(Bstr(name).Get());
     EXPECT_EQ(quick.code, typeLibrary.code);
     EXPECT_EQ(quick.description, typeLibrary.description);
-    EXPECT_EQ(quick.value.Get()->vt, typeLibrary.value.Get()->vt);
-    if (quick.value.Get()->vt == VT_DISPATCH)
-        EXPECT_EQ(IdentityOf(quick.value.Get()->pdispVal), IdentityOf(typeLibrary.value.Get()->pdispVal));
+    ASSERT_EQ(quick.value.Get()->vt, typeLibrary.value.Get()->vt);
+    if (quick.value.Get()->vt != VT_DISPATCH) return;
+    IDispatch* quickSession = quick.value.Get()->pdispVal;
+    IDispatch* typeLibrarySession = typeLibrary.value.Get()->pdispVal;
+    ASSERT_EQ(quickSession == nullptr, typeLibrarySession == nullptr);
+    if (quickSession) {
+        EXPECT_EQ(IdentityOf(quickSession), IdentityOf(typeLibrarySession));
+    }
 }
 
 // Fault caught: the quick path handed back another variant type or session than the type library
