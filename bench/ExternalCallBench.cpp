@@ -1,7 +1,10 @@
 // What the shared external process costs a client: the first forwarded request (which starts the
 // server), then the per-call cost of a forwarded GetInstrSession and of a call on a session that
 // lives in the external process, each beside the same call in this process. Prints medians and
-// ratios.
+// ratios, and the row
+//
+//   P6  forwarded GetInstrSession / a bare marshalled call to the same server (its ProcessId),
+//       medians of batches that alternate so that both see the same load
 //
 //   wine bench_external_call.exe [calls]      (default 500; DLL and server must be registered)
 #include <algorithm>
@@ -10,9 +13,11 @@
 #include <cstdlib>
 #include <vector>
 
+#include "BenchReport.h"
 #include "com/ComPtr.h"
 #include "com/Interfaces.h"
 #include "com/UniqueHandles.h"
+#include "manager/ExternalProcessServer.h"
 
 using namespace sm;
 
@@ -71,6 +76,28 @@ int main(int argc, char** argv) {
         LONG value = 0;
         double localCall = MedianMicroseconds(calls, [&] { local->GetLong(id.Get(), &value); });
         double externalCall = MedianMicroseconds(calls, [&] { external->GetLong(id.Get(), &value); });
+
+        // P6: the server's own no-op property against the forwarded hit, in alternating batches.
+        ComPtr<IExternalProcessServer> server;
+        Check(::CoCreateInstance(CLSID_ExternalProcessServer, nullptr, CLSCTX_LOCAL_SERVER, IID_IExternalProcessServer,
+                                 server.PutVoid()),
+              "CoCreateInstance(ExternalProcessServer)");
+        LONG processId = 0;
+        std::vector<double> forwarded, bare;
+        int batch = std::max(1, calls / 10);
+        for (int round = 0; round < 10; ++round) {
+            forwarded.push_back(MedianMicroseconds(batch, [&] { Session(manager.Get(), L"*CUSTOM::Bench"); }));
+            bare.push_back(MedianMicroseconds(batch, [&] { server->get_ProcessId(&processId); }));
+        }
+        std::sort(forwarded.begin(), forwarded.end());
+        std::sort(bare.begin(), bare.end());
+        double forwardedMedian = forwarded[forwarded.size() / 2], bareMedian = bare[bare.size() / 2];
+        char figure[32], reference[32];
+        std::snprintf(figure, sizeof figure, "%.0f us", forwardedMedian);
+        std::snprintf(reference, sizeof reference, "%.0f us", bareMedian);
+        bench::Row("P6", "forwarded GetInstrSession(\"*CUSTOM::Bench\") through the external-process server", figure,
+                   "bare marshalled call to the same server (ProcessId)", reference, forwardedMedian / bareMedian,
+                   "<= 1.2");
 
         std::printf("first forwarded request (starts the server): %.1f ms\n", firstActivation / 1000.0);
         std::printf("GetInstrSession, this process:     %9.2f us median of %d\n", localGet, calls);

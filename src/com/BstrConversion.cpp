@@ -72,6 +72,26 @@ std::string WideToMultiByte(const wchar_t* text, std::size_t length) {
 
 void Assign(String& target, BSTR text) { target.Assign(std::string_view(BstrToMultiByte(text))); }
 
+BstrText::BstrText(BSTR text) {
+    std::size_t length = text ? ::SysStringLen(text) : 0;
+    if (length <= sizeof shortText) {
+        std::size_t used = 0;
+        for (; used < length; ++used) {
+            wchar_t character = text[used];
+            // A BSTR may carry embedded NULs; the text ends at the first one.
+            if (character == L'\0') break;
+            if (character >= 0x80) break;
+            shortText[used] = static_cast<char>(character);
+        }
+        if (used == length || text[used] == L'\0') {
+            view = std::string_view(shortText, used);
+            return;
+        }
+    }
+    converted = WideToMultiByte(text, length);
+    view = converted;
+}
+
 DynamicString TrimmedString(BSTR text) {
     DynamicString trimmed(std::string_view(BstrToMultiByte(text)));
     trimmed.Trim();

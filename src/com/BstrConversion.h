@@ -23,6 +23,23 @@ void Assign(String& target, BSTR text);
 // The text of a BSTR argument without leading and trailing white space, as names are compared.
 DynamicString TrimmedString(BSTR text);
 
+// The multibyte text of a BSTR argument for the duration of one call, the same text
+// BstrToMultiByte gives. Short seven-bit texts (almost every name) are copied into the object
+// itself: every ANSI code page encodes them byte for byte, and a lookup then needs neither the
+// system's conversion nor the heap.
+class BstrText {
+public:
+    explicit BstrText(BSTR text);
+    BstrText(const BstrText&) = delete;
+    BstrText& operator=(const BstrText&) = delete;
+    std::string_view View() const { return view; }
+
+private:
+    char shortText[128];
+    std::string converted;
+    std::string_view view;
+};
+
 // BSTR converted from system-ANSI text (error descriptions).
 BSTR AnsiToBstr(std::string_view text);
 

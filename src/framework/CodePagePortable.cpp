@@ -16,13 +16,12 @@ bool SetMultiByteCodePage(int codePage) {
     return true;
 }
 
-bool IsLeadByte(unsigned char byte) {
+bool IsExtendedLeadByte(unsigned char byte) {
     if (currentCodePage.load() != 932) return false;
     return (byte >= 0x81 && byte <= 0x9F) || (byte >= 0xE0 && byte <= 0xFC);
 }
 
-unsigned char LowerSingleByte(unsigned char byte) {
-    if (byte >= 'A' && byte <= 'Z') return static_cast<unsigned char>(byte + ('a' - 'A'));
+unsigned char LowerExtendedByte(unsigned char byte) {
     if (currentCodePage.load() == 1252) {
         if (byte >= 0xC0 && byte <= 0xDE && byte != 0xD7) return static_cast<unsigned char>(byte + 0x20);
         switch (byte) {

@@ -11,9 +11,9 @@ int GetMultiByteCodePage() { return _getmbcp(); }
 
 bool SetMultiByteCodePage(int codePage) { return _setmbcp(codePage) == 0; }
 
-bool IsLeadByte(unsigned char byte) { return _ismbblead(byte) != 0; }
+bool IsExtendedLeadByte(unsigned char byte) { return _ismbblead(byte) != 0; }
 
-unsigned char LowerSingleByte(unsigned char byte) {
+unsigned char LowerExtendedByte(unsigned char byte) {
     return static_cast<unsigned char>(_mbctolower(byte));
 }
 

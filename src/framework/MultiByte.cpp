@@ -45,6 +45,16 @@ unsigned CharCode(std::string_view text, std::size_t offset, std::size_t bytes, 
 int Compare(std::string_view left, std::string_view right, bool ignoreCase) {
     std::size_t l = 0, r = 0;
     while (l < left.size() && r < right.size()) {
+        auto leftByte = static_cast<unsigned char>(left[l]), rightByte = static_cast<unsigned char>(right[r]);
+        if (leftByte < 0x80 && rightByte < 0x80) {
+            // Two seven-bit characters: single bytes in every code page.
+            unsigned lc = ignoreCase ? LowerSingleByte(leftByte) : leftByte;
+            unsigned rc = ignoreCase ? LowerSingleByte(rightByte) : rightByte;
+            if (lc != rc) return lc < rc ? -1 : 1;
+            ++l;
+            ++r;
+            continue;
+        }
         std::size_t lb = CharBytes(left, l), rb = CharBytes(right, r);
         unsigned lc = CharCode(left, l, lb, ignoreCase), rc = CharCode(right, r, rb, ignoreCase);
         if (lc != rc) return lc < rc ? -1 : 1;
@@ -61,13 +71,32 @@ bool BeginsWith(std::string_view text, std::string_view prefix, bool ignoreCase)
     return Compare(text.substr(0, bytes), prefix, ignoreCase) == 0;
 }
 
-std::string ToLower(std::string_view text) {
-    std::string lowered(text);
-    for (std::size_t offset = 0; offset < lowered.size();) {
-        std::size_t bytes = CharBytes(lowered, offset);
-        if (bytes == 1) lowered[offset] = static_cast<char>(LowerSingleByte(static_cast<unsigned char>(lowered[offset])));
+std::string_view Trimmed(std::string_view text) {
+    std::size_t start = 0;
+    while (start < text.size() && CharBytes(text, start) == 1 && IsSingleByteSpace(static_cast<unsigned char>(text[start])))
+        ++start;
+    // Walk forward so a trail byte that happens to equal a blank is never mistaken for one.
+    std::size_t end = start, offset = start;
+    while (offset < text.size()) {
+        std::size_t bytes = CharBytes(text, offset);
+        offset += bytes;
+        if (bytes != 1 || !IsSingleByteSpace(static_cast<unsigned char>(text[offset - 1]))) end = offset;
+    }
+    return text.substr(start, end - start);
+}
+
+void LowerInPlace(char* text, std::size_t length) {
+    std::string_view view(text, length);
+    for (std::size_t offset = 0; offset < length;) {
+        std::size_t bytes = CharBytes(view, offset);
+        if (bytes == 1) text[offset] = static_cast<char>(LowerSingleByte(static_cast<unsigned char>(text[offset])));
         offset += bytes;
     }
+}
+
+std::string ToLower(std::string_view text) {
+    std::string lowered(text);
+    LowerInPlace(lowered.data(), lowered.size());
     return lowered;
 }
 

@@ -29,6 +29,13 @@ int Compare(std::string_view left, std::string_view right, bool ignoreCase);
 // True when text begins with prefix, compared character by character.
 bool BeginsWith(std::string_view text, std::string_view prefix, bool ignoreCase);
 
+// The text without leading and trailing single-byte blanks (IsSingleByteSpace); a trail byte that
+// equals a blank is never taken for one.
+std::string_view Trimmed(std::string_view text);
+
+// ToLower on a writable buffer of length bytes.
+void LowerInPlace(char* text, std::size_t length);
+
 // Lower-cases every single-byte character, leaving double-byte characters alone (as _mbslwr does).
 std::string ToLower(std::string_view text);
 

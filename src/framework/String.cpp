@@ -128,17 +128,9 @@ void String::Mid(std::size_t charPosition, std::int64_t charCount, String& targe
 
 void String::Trim() {
     std::string_view mine = View();
-    std::size_t start = 0;
-    while (start < mine.size() && multibyte::CharBytes(mine, start) == 1 &&
-           IsSingleByteSpace(static_cast<unsigned char>(mine[start])))
-        ++start;
-    // Walk forward so a trail byte that happens to equal a blank is never mistaken for one.
-    std::size_t end = start, offset = start;
-    while (offset < mine.size()) {
-        std::size_t bytes = multibyte::CharBytes(mine, offset);
-        offset += bytes;
-        if (bytes != 1 || !IsSingleByteSpace(static_cast<unsigned char>(mine[offset - 1]))) end = offset;
-    }
+    std::string_view kept = multibyte::Trimmed(mine);
+    std::size_t start = static_cast<std::size_t>(kept.data() - mine.data());
+    std::size_t end = start + kept.size();
     if (end < mine.size()) Splice(end, mine.size() - end, {});
     if (start > 0) Splice(0, start, {});
 }

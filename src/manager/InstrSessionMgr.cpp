@@ -28,11 +28,14 @@ CInstrSessionMgr::~CInstrSessionMgr() {
     for (unsigned frequency = 3000; frequency > 1000; frequency -= 200) LifeTimeAlert(frequency, 10);
     // While the process goes away the proxies' channels may already be gone: a release would have
     // to call out to the server and could hang the exit. The server notices the ended process.
-    for (auto& server : externalServer) {
-        if (IsModuleDetaching())
-            server.Detach();
-        else
-            server.Reset();
+    for (int index = 0; index < 2; ++index) {
+        if (IsModuleDetaching()) {
+            externalManager[index].Detach();
+            externalServer[index].Detach();
+        } else {
+            externalManager[index].Reset();
+            externalServer[index].Reset();
+        }
     }
 }
 
@@ -69,22 +72,31 @@ bool CInstrSessionMgr::IsVisibleCategoryName(std::string_view text) const {
 }
 
 void CInstrSessionMgr::SplitSessionName(std::string_view text, String& category, String& name) const {
+    std::string_view categoryPart, namePart;
+    SplitSessionName(text, categoryPart, namePart);
+    category.Assign(categoryPart);
+    name.Assign(namePart);
+}
+
+// The parts are views into text (or AnyCategory): a lookup splits a name without copying it.
+void CInstrSessionMgr::SplitSessionName(std::string_view text, std::string_view& category,
+                                        std::string_view& name) const {
     std::size_t position = 0, length = 0;
     if (!FindCategorySeparator(text, &position, &length)) {
-        name.Assign(text);
-        category.Assign(AnyCategory);
+        name = text;
+        category = AnyCategory;
         return;
     }
     std::size_t nameStart = multibyte::ByteOffset(text, position + length);
-    DynamicString prefix(text.substr(0, multibyte::ByteOffset(text, position)));
-    if (!IsVisibleCategoryName(prefix.View()) && !IsAnyCategory(prefix.View())) {
+    std::string_view prefix = text.substr(0, multibyte::ByteOffset(text, position));
+    if (!IsVisibleCategoryName(prefix) && !IsAnyCategory(prefix)) {
         // The prefix was no category after all: the whole text is the name.
-        name.Assign(text);
-        category.Assign(AnyCategory);
+        name = text;
+        category = AnyCategory;
         return;
     }
-    category.Assign(prefix);
-    name.Assign(text.substr(nameStart));
+    category = prefix;
+    name = text.substr(nameStart);
 }
 
 void CInstrSessionMgr::SplitCategoryArgument(std::string_view text, String& category, String& subCategory) const {
@@ -110,15 +122,20 @@ STDMETHODIMP CInstrSessionMgr::GetInstrSession(BSTR name, VARIANT_BOOL newSessio
     if (!session) return E_POINTER;
     *session = nullptr;
     return ManagerCall([&]() -> HRESULT {
-        DynamicString text = TrimmedString(name);
-        if (ShouldForward(text.View()))
-            return GetExternalMgr(ExternalProcessIndex(text.View()))->GetInstrSession(name, newSession, session);
-        StripExternalPrefix(text);
-        DynamicString category, sessionName;
-        SplitSessionName(text.View(), category, sessionName);
+        // A hit is the hot path of every test step: the name is taken apart as views of one
+        // converted text, without copies.
+        BstrText converted(name);
+        std::string_view text = multibyte::Trimmed(converted.View());
+        if (ShouldForward(text))
+            return CallExternal(ExternalProcessIndex(text), [&](IInstrSessionMgr* external) {
+                return external->GetInstrSession(name, newSession, session);
+            });
+        text = WithoutExternalPrefix(text);
+        std::string_view category, sessionName;
+        SplitSessionName(text, category, sessionName);
         ComPtr<IInstrSession> found;
-        if (newSession || !FindExistingSession(category.View(), sessionName.View(), found)) {
-            if (!CreateInstrSession(category.View(), sessionName.View(), found)) {
+        if (newSession || !FindExistingSession(category, sessionName, found)) {
+            if (!CreateInstrSession(category, sessionName, found)) {
                 DynamicString message("'");
                 message.Append(text).Append("' ").Append("is not a driver session name");
                 TE_RAISE(TE_UNRECOGNIZED_VALUE, "CInstrSessionMgr::GetInstrSession", message);
@@ -130,9 +147,9 @@ STDMETHODIMP CInstrSessionMgr::GetInstrSession(BSTR name, VARIANT_BOOL newSessio
     });
 }
 
+// The caller holds the manager lock (GetInstrSession, from entry to exit).
 bool CInstrSessionMgr::FindExistingSession(std::string_view category, std::string_view name,
                                            ComPtr<IInstrSession>& found) {
-    CriticalSectionGuard guard(lock);
     // The index gives the session a scan of the table in order would give, without asking each.
     sessionIndex.CatchUp(sessions);
     IInstrSession* session = sessionIndex.Find(category, name);
@@ -258,7 +275,8 @@ STDMETHODIMP CInstrSessionMgr::put_AudibleLifeTimeAlerts(VARIANT_BOOL value) {
         SetAudibleLifeTimeAlerts(value != 0);
         if (inExternalProcess) return;
         for (int index = 0; index < 2; ++index)
-            if (externalServer[index]) GetExternalMgr(index)->put_AudibleLifeTimeAlerts(value);
+            if (externalServer[index])
+                CallExternal(index, [&](IInstrSessionMgr* external) { return external->put_AudibleLifeTimeAlerts(value); });
     });
 }
 
@@ -267,7 +285,8 @@ STDMETHODIMP CInstrSessionMgr::InvalidateVisaResourceList() {
         visaInfo.InvalidateResourceList();
         if (inExternalProcess) return;
         for (int index = 0; index < 2; ++index)
-            if (externalServer[index]) GetExternalMgr(index)->InvalidateVisaResourceList();
+            if (externalServer[index])
+                CallExternal(index, [](IInstrSessionMgr* external) { return external->InvalidateVisaResourceList(); });
     });
 }
 

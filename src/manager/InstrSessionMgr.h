@@ -10,6 +10,7 @@
 #include "com/Implements.h"
 #include "com/Interfaces.h"
 #include "com/UniqueHandles.h"
+#include "manager/ExternalConnection.h"
 #include "manager/SessionIndex.h"
 #include "sessions/SessionBase.h"
 #include "sources/IviInfo.h"
@@ -43,6 +44,10 @@ public:
     STDMETHODIMP InvalidateVisaResourceList() override;
     STDMETHODIMP GetUniqueKeyName(BSTR* keyName) override;
 
+    // IDispatch: the plain late-bound GetInstrSession is answered without the type library.
+    STDMETHODIMP Invoke(DISPID member, REFIID iid, LCID locale, WORD flags, DISPPARAMS* parameters, VARIANT* result,
+                        EXCEPINFO* exception, UINT* argumentError) override;
+
     // SessionOwner
     void LockTable() override { lock.Lock(); }
     void UnlockTable() override { lock.Unlock(); }
@@ -53,6 +58,7 @@ public:
     // Name rules that depend on this manager's hidden categories.
     bool IsVisibleCategoryName(std::string_view text) const;
     void SplitSessionName(std::string_view text, String& category, String& name) const;
+    void SplitSessionName(std::string_view text, std::string_view& category, std::string_view& name) const;
     void SplitCategoryArgument(std::string_view text, String& category, String& subCategory) const;
 
 protected:
@@ -88,6 +94,15 @@ private:
 
     // The external process managers (index 0: 64-bit, 1: 32-bit).
     ComPtr<IInstrSessionMgr> GetExternalMgr(int index);
+    // Runs call (IInstrSessionMgr* -> HRESULT) on the external manager of index; see
+    // CallKeptOrReconnect for a kept manager whose server has gone.
+    template <class Call>
+    HRESULT CallExternal(int index, Call&& call) {
+        return CallKeptOrReconnect(
+            static_cast<bool>(externalManager[index]), [&] { return GetExternalMgr(index); },
+            [&] { externalManager[index].Reset(); },
+            [&](const ComPtr<IInstrSessionMgr>& external) { return call(external.Get()); });
+    }
     bool ShouldForward(std::string_view trimmedText) const;
 
     CriticalSection lock;
@@ -104,6 +119,10 @@ private:
     bool customHidden = false;
     bool inExternalProcess = false;
     ComPtr<IUnknown> externalServer[2];
+    // The external manager obtained at the first connection, kept with the server pointer: the
+    // server's manager is a singleton, so asking the server again on every forwarded request (four
+    // cross-process calls) would hand back the same object.
+    ComPtr<IInstrSessionMgr> externalManager[2];
     std::int32_t uniqueKeyCounter = 0;
 };
 

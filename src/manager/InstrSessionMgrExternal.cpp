@@ -41,6 +41,9 @@ void RunStage(Stage&& stage, const char* explanation) {
 ComPtr<IInstrSessionMgr> CInstrSessionMgr::GetExternalMgr(int index) {
     CriticalSectionGuard guard(lock);
     if (inExternalProcess) TE_RAISE(TE_PROGRAM_ERROR, getExternalMgr);
+    // The external flag and the alert setting were given to this manager when it was obtained;
+    // later alert settings reach it through put_AudibleLifeTimeAlerts.
+    if (externalManager[index]) return externalManager[index];
 
     ComPtr<IExternalProcessServer> server;
     RunStage(
@@ -76,6 +79,7 @@ ComPtr<IInstrSessionMgr> CInstrSessionMgr::GetExternalMgr(int index) {
     if (queried != S_OK) throw ComError(FAILED(queried) ? queried : E_NOINTERFACE);
     external->put_InExternalProcess(VARIANT_TRUE);
     external->put_AudibleLifeTimeAlerts(AudibleLifeTimeAlertsEnabled() ? VARIANT_TRUE : VARIANT_FALSE);
+    externalManager[index] = external;
     return external;
 }
 

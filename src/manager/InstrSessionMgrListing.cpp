@@ -30,7 +30,9 @@ STDMETHODIMP CInstrSessionMgr::GetNames(BSTR category, GetNamesOptions flags, BS
     return ManagerCall([&]() -> HRESULT {
         DynamicString text = TrimmedString(category);
         if (ShouldForward(text.View()))
-            return GetExternalMgr(ExternalProcessIndex(text.View()))->GetNames(category, flags, filter, names);
+            return CallExternal(ExternalProcessIndex(text.View()), [&](IInstrSessionMgr* external) {
+                return external->GetNames(category, flags, filter, names);
+            });
         bool starPrefix = HasExternalPrefix(text.View()) && ExternalProcessIndex(text.View()) == 0;
         StripExternalPrefix(text);
         StringVector filters = SplitFilterList(BstrToMultiByte(filter));
@@ -76,7 +78,8 @@ STDMETHODIMP CInstrSessionMgr::GetSessions(BSTR category, SAFEARRAY** result) {
     return ManagerCall([&]() -> HRESULT {
         DynamicString text = TrimmedString(category);
         if (ShouldForward(text.View()))
-            return GetExternalMgr(ExternalProcessIndex(text.View()))->GetSessions(category, result);
+            return CallExternal(ExternalProcessIndex(text.View()),
+                                [&](IInstrSessionMgr* external) { return external->GetSessions(category, result); });
         StripExternalPrefix(text);
         *result = GetSessionListSafeArray(text.View());
         return S_OK;
@@ -112,7 +115,8 @@ STDMETHODIMP CInstrSessionMgr::GetCategories(BSTR baseCategory, SAFEARRAY** resu
     return ManagerCall([&]() -> HRESULT {
         DynamicString text = TrimmedString(baseCategory);
         if (ShouldForward(text.View()))
-            return GetExternalMgr(ExternalProcessIndex(text.View()))->GetCategories(baseCategory, result);
+            return CallExternal(ExternalProcessIndex(text.View()),
+                                [&](IInstrSessionMgr* external) { return external->GetCategories(baseCategory, result); });
         StripExternalPrefix(text);
         StringVector list;
         GetCategoryNames(text.View(), list);
@@ -182,7 +186,7 @@ void CInstrSessionMgr::AppendStateDescription(String& text) {
     for (int index = 0; index < 2; ++index) {
         if (!externalServer[index]) continue;
         UniqueBstr external;
-        CheckHResult(GetExternalMgr(index)->get_StateDescription(external.Put()));
+        CheckHResult(CallExternal(index, [&](IInstrSessionMgr* manager) { return manager->get_StateDescription(external.Put()); }));
         text.Append("\n\n").Append(BstrToMultiByte(external.Get()));
     }
 }

@@ -22,8 +22,20 @@ bool SessionIndex::Matches(const Slot& slot, std::string_view category, std::str
 }
 
 IInstrSession* SessionIndex::Find(std::string_view category, std::string_view name) const {
+    // Short names are lowered on the stack: the lookup of a hit allocates nothing.
+    char shortKey[128];
+    std::string longKey;
+    std::string_view key;
+    if (name.size() <= sizeof shortKey) {
+        std::copy(name.begin(), name.end(), shortKey);
+        multibyte::LowerInPlace(shortKey, name.size());
+        key = std::string_view(shortKey, name.size());
+    } else {
+        longKey = Key(name);
+        key = longKey;
+    }
     const Slot* best = nullptr;
-    if (auto found = byName.find(Key(name)); found != byName.end()) {
+    if (auto found = byName.find(key); found != byName.end()) {
         for (const Slot& slot : found->second) {
             if (!Matches(slot, category, name)) continue;
             best = &slot;
@@ -91,13 +103,16 @@ void SessionIndex::Remove(SessionBase& session) {
 void SessionIndex::NoteRenamed(SessionBase& session) {
     std::lock_guard<std::mutex> guard(renamedMutex);
     if (std::find(renamed.begin(), renamed.end(), &session) == renamed.end()) renamed.push_back(&session);
+    anyRenamed.store(true, std::memory_order_release);
 }
 
 // Sessions not indexed yet are filed with their current names when CatchUp reaches them.
 void SessionIndex::RefileRenamed() {
+    if (!anyRenamed.load(std::memory_order_acquire)) return;
     std::vector<SessionBase*> pending;
     {
         std::lock_guard<std::mutex> guard(renamedMutex);
+        anyRenamed.store(false, std::memory_order_relaxed);
         if (renamed.empty()) return;
         pending.swap(renamed);
     }

@@ -4,8 +4,10 @@
 // accepts the name. Sessions that cannot list their names are scanned as before.
 #pragma once
 
+#include <atomic>
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <mutex>
 #include <string>
 #include <string_view>
@@ -59,7 +61,13 @@ private:
     static void InsertInOrder(std::vector<Slot>& slots, const Slot& slot);
     static void EraseSession(std::vector<Slot>& slots, const SessionBase* base);
 
-    std::unordered_map<std::string, std::vector<Slot>> byName;  // lower-case name -> sessions, in order
+    // Looked up by views, so that a lookup lowers its name into a buffer of its own.
+    struct KeyHash {
+        using is_transparent = void;
+        std::size_t operator()(std::string_view key) const { return std::hash<std::string_view>{}(key); }
+    };
+
+    std::unordered_map<std::string, std::vector<Slot>, KeyHash, std::equal_to<>> byName;  // lower-case name -> sessions, in order
     std::vector<Slot> unlisted;                                  // sessions scanned on every lookup
     std::unordered_map<const SessionBase*, Entry> entries;
     std::uint64_t nextOrder = 0;
@@ -67,6 +75,7 @@ private:
     // Renames arrive under the session's own lock, not the table lock: a leaf lock guards the list.
     std::mutex renamedMutex;
     std::vector<SessionBase*> renamed;
+    std::atomic<bool> anyRenamed{false};  // lets a lookup skip the leaf lock when nothing was renamed
 };
 
 }  // namespace sm

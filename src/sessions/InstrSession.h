@@ -221,6 +221,10 @@ protected:
     // work then runs with the count pinned far from zero: a close function or a release-on-close
     // object that takes and drops a reference to the session must not start a second release.
     ULONG InternalRelease() override {
+        // A release that leaves other references behind cannot be the final one and needs no table
+        // lock; only a release that finds the count at 1 goes on below, and it takes the lock.
+        for (ULONG current = this->references.load(); current > 1;)
+            if (this->references.compare_exchange_weak(current, current - 1)) return current - 1;
         ULONG left = 0;
         if (SessionOwner* tableOwner = Owner()) {
             tableOwner->LockTable();

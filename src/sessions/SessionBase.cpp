@@ -30,7 +30,10 @@ SessionBase::~SessionBase() {
     DetachData("");
 }
 
-bool SessionBase::HasName(std::string_view candidate) const { return name.Compare(candidate, true) == 0; }
+// Equal texts have equal byte lengths (see SameCategory); most candidates differ in length.
+bool SessionBase::HasName(std::string_view candidate) const {
+    return name.Size() == candidate.size() && name.Compare(candidate, true) == 0;
+}
 
 bool SessionBase::AcceptsSubcategory(std::string_view subCategory) const {
     return subCategory.empty() || subCategory == "?";

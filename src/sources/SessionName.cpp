@@ -7,11 +7,14 @@ namespace sm {
 bool IsAnyCategory(std::string_view category) { return category.empty() || category == AnyCategory; }
 
 bool SameCategory(std::string_view left, std::string_view right) {
-    return multibyte::Compare(left, right, true) == 0;
+    // Texts that compare equal have equal byte lengths: each character is lowered to one of its
+    // own length.
+    return left.size() == right.size() && multibyte::Compare(left, right, true) == 0;
 }
 
 namespace {
 bool IsThirtyTwoBitRoute(std::string_view text) {
+    if (text.empty() || text[0] != '3') return false;
     return multibyte::Compare(text, "32*RQ", true) == 0 || multibyte::BeginsWith(text, "32*RQ::", true);
 }
 }  // namespace
@@ -52,6 +55,12 @@ void StripExternalPrefix(String& text) {
         text.Delete(0, 3);
     else if (!text.IsEmpty() && text.GetText()[0] == '*')
         text.Delete(0, 1);
+}
+
+std::string_view WithoutExternalPrefix(std::string_view text) {
+    if (IsThirtyTwoBitRoute(text)) return text.substr(3);
+    if (!text.empty() && text[0] == '*') return text.substr(1);
+    return text;
 }
 
 void AddExternalPrefix(String& text) {

@@ -29,6 +29,7 @@ bool FindCategorySeparator(std::string_view text, std::size_t* position, std::si
 bool HasExternalPrefix(std::string_view text);
 int ExternalProcessIndex(std::string_view text);
 void StripExternalPrefix(String& text);
+std::string_view WithoutExternalPrefix(std::string_view text);
 void AddExternalPrefix(String& text);
 
 }  // namespace sm

@@ -1,0 +1,55 @@
+// The manager answers the plain late-bound GetInstrSession itself: what it answers must be what the
+// type library's dispatch answers for the same call.
+#include <gtest/gtest.h>
+
+#include "com/ComClient.h"
+
+namespace {
+
+using namespace sm;
+using namespace sm::testing;
+
+// The same call through the type library's dispatch, on the manager's vtable.
+LateResult TypeLibraryInvoke(IInstrSessionMgr* manager, const Arguments& arguments) {
+    LateResult outcome;
+    ComPtr<ITypeInfo> info;
+    EXPECT_EQ(manager->GetTypeInfo(0, LOCALE_USER_DEFAULT, info.Put()), S_OK);
+    std::vector<VARIANT> reversed = arguments.Reversed();
+    DISPPARAMS parameters{reversed.data(), nullptr, static_cast<UINT>(reversed.size()), 0};
+    UniqueExcepInfo exception;
+    outcome.result = info->Invoke(manager, 3, DISPATCH_METHOD, &parameters, outcome.value.Get(), &exception, nullptr);
+    if (outcome.result == DISP_E_EXCEPTION) {
+        outcome.code = static_cast<unsigned long>(exception.scode);
+        outcome.description = Text(exception.bstrDescription);
+    }
+    return outcome;
+}
+
+void ExpectSameAnswer(IInstrSessionMgr* manager, const wchar_t* name) {
+    Arguments arguments;
+    arguments.Text(name).Bool(false);
+    LateResult quick = Invoke(manager, L"GetInstrSession", DISPATCH_METHOD, arguments);
+    LateResult typeLibrary = TypeLibraryInvoke(manager, arguments);
+    EXPECT_EQ(quick.result, typeLibrary.result) << Text(Bstr(name).Get());
+    EXPECT_EQ(quick.code, typeLibrary.code);
+    EXPECT_EQ(quick.description, typeLibrary.description);
+    ASSERT_EQ(quick.value.Get()->vt, typeLibrary.value.Get()->vt);
+    if (quick.value.Get()->vt != VT_DISPATCH) return;
+    IDispatch* quickSession = quick.value.Get()->pdispVal;
+    IDispatch* typeLibrarySession = typeLibrary.value.Get()->pdispVal;
+    ASSERT_EQ(quickSession == nullptr, typeLibrarySession == nullptr);
+    if (quickSession) {
+        EXPECT_EQ(IdentityOf(quickSession), IdentityOf(typeLibrarySession));
+    }
+}
+
+// Fault caught: the quick path handed back another variant type or session than the type library
+// does, or lost the error's code and text on a name that is no session name.
+TEST(ManagerDispatch, PlainGetInstrSessionAnswersAsTheTypeLibrary) {
+    auto manager = CreateManager();
+    auto kept = GetSession(manager.Get(), L"CUSTOM::LateBound");
+    ExpectSameAnswer(manager.Get(), L"  custom::latebound ");
+    ExpectSameAnswer(manager.Get(), L"Foo::Bar");
+}
+
+}  // namespace
