@@ -10,6 +10,8 @@
 #include <windows.h>
 #include <psapi.h>
 
+#include "ProcessMemory.h"
+
 #include <cstdint>
 #include <cstdio>
 #include <string>
@@ -23,6 +25,8 @@
 using namespace sm;
 
 namespace {
+
+using bench::HeapBytes;
 
 // A stand-in pinned by the path the product loads it from, so that its counters outlive the
 // product's FreeLibrary; opens and closes are the stand-in's own call counts.
@@ -48,19 +52,6 @@ struct Category {
     Counted counted;
 };
 
-std::size_t HeapBytes() {
-    std::vector<HANDLE> heaps(::GetProcessHeaps(0, nullptr) + 16);
-    heaps.resize(::GetProcessHeaps(static_cast<DWORD>(heaps.size()), heaps.data()));
-    std::size_t total = 0;
-    for (HANDLE heap : heaps) {
-        if (!::HeapLock(heap)) continue;
-        PROCESS_HEAP_ENTRY entry{};
-        while (::HeapWalk(heap, &entry))
-            if (entry.wFlags & PROCESS_HEAP_ENTRY_BUSY) total += entry.cbData + entry.cbOverhead;
-        ::HeapUnlock(heap);
-    }
-    return total;
-}
 
 // Open kernel handles of this process. Wine answers GetProcessHandleCount with 0, so the handle
 // table is probed value by value (handles are multiples of 4).

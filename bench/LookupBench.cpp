@@ -13,6 +13,8 @@
 #include <windows.h>
 #include <psapi.h>
 
+#include "ProcessMemory.h"
+
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -29,6 +31,9 @@
 using namespace sm;
 
 namespace {
+
+using bench::HeapBytes;
+using bench::PrivateBytes;
 
 constexpr int otherSessions = 999;        // with the target: 1,000 live sessions
 constexpr int configuredInstruments = 1250;  // VXIplug&play, with as many logical names: 2,500 names
@@ -87,29 +92,6 @@ std::string Micro(double seconds) {
     char text[64];
     std::snprintf(text, sizeof text, "%.2f us", seconds * 1e6);
     return text;
-}
-
-std::size_t PrivateBytes() {
-    PROCESS_MEMORY_COUNTERS_EX counters{};
-    counters.cb = sizeof counters;
-    ::GetProcessMemoryInfo(::GetCurrentProcess(), reinterpret_cast<PROCESS_MEMORY_COUNTERS*>(&counters), sizeof counters);
-    return counters.PrivateUsage;
-}
-
-// Bytes in use on every heap of the process (blocks and their overhead): under Wine the private
-// bytes counter stays 0, the heaps are where a session's memory lives.
-std::size_t HeapBytes() {
-    std::vector<HANDLE> heaps(::GetProcessHeaps(0, nullptr) + 16);
-    heaps.resize(::GetProcessHeaps(static_cast<DWORD>(heaps.size()), heaps.data()));
-    std::size_t total = 0;
-    for (HANDLE heap : heaps) {
-        if (!::HeapLock(heap)) continue;
-        PROCESS_HEAP_ENTRY entry{};
-        while (::HeapWalk(heap, &entry))
-            if (entry.wFlags & PROCESS_HEAP_ENTRY_BUSY) total += entry.cbData + entry.cbOverhead;
-        ::HeapUnlock(heap);
-    }
-    return total;
 }
 
 struct Memory {
