@@ -71,6 +71,7 @@ Stamp StampOf(const std::string& path) {
 }
 
 Setup Read(const std::string& path) {
+    auto sections = std::make_shared<std::vector<Section>>();
     Setup setup;
     setup.path = path;
     std::ifstream file(path, std::ios::binary);
@@ -80,14 +81,15 @@ Setup Read(const std::string& path) {
         line = Trim(line);
         if (line.empty() || line[0] == ';' || line[0] == '#') continue;
         if (line.front() == '[' && line.back() == ']') {
-            setup.sections.push_back({Trim(line.substr(1, line.size() - 2)), {}});
-            current = &setup.sections.back();
+            sections->push_back({Trim(line.substr(1, line.size() - 2)), {}});
+            current = &sections->back();
             continue;
         }
         std::size_t equals = line.find('=');
         if (!current || equals == std::string::npos) continue;
         current->entries.emplace_back(Trim(line.substr(0, equals)), Unquote(Trim(line.substr(equals + 1))));
     }
+    setup.sections = std::move(sections);
     return setup;
 }
 
@@ -136,7 +138,8 @@ Setup Setup::Current() {
     std::lock_guard<std::mutex> guard(StateLock());
     Stamp stamp = StampOf(SetupPath());
     if (!(stamp == cachedStamp)) {
-        cached = stamp.exists ? Read(stamp.path) : Setup{{}, stamp.path};
+        cached = stamp.exists ? Read(stamp.path) : Setup{};
+        cached.path = stamp.path;
         cachedStamp = stamp;
     }
     return cached;
@@ -144,7 +147,7 @@ Setup Setup::Current() {
 
 std::vector<std::string> Setup::Objects(const std::string& area) const {
     std::vector<std::string> objects;
-    for (const Section& section : sections) {
+    for (const Section& section : *sections) {
         if (section.name.size() <= area.size() || !EqualNoCase(section.name.substr(0, area.size()), area)) continue;
         if (section.name[area.size()] != ' ') continue;
         objects.push_back(Trim(section.name.substr(area.size() + 1)));
@@ -154,7 +157,7 @@ std::vector<std::string> Setup::Objects(const std::string& area) const {
 
 const Section* Setup::Find(const std::string& area, const std::string& object) const {
     std::string name = object.empty() ? area : area + " " + object;
-    for (const Section& section : sections)
+    for (const Section& section : *sections)
         if (EqualNoCase(section.name, name)) return &section;
     return nullptr;
 }

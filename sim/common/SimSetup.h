@@ -7,6 +7,7 @@
 // or a user can edit it between two calls without restarting the process.
 #pragma once
 
+#include <memory>
 #include <string>
 #include <utility>
 #include <vector>
@@ -38,7 +39,8 @@ public:
                  long fallback = 0) const;
     bool Has(const std::string& area, const std::string& object, const std::string& key) const;
 
-    std::vector<Section> sections;
+    // Shared by every copy: Current() hands out the cached file without copying it.
+    std::shared_ptr<const std::vector<Section>> sections = std::make_shared<std::vector<Section>>();
     std::string path;
 };
 
