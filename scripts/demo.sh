@@ -10,10 +10,8 @@ source "$root/scripts/lib.sh"
 sm_install_packages
 sm_configure_windows
 echo "== building SessionMgr.dll and DemoClient.exe in $SM_WINDOWS_BUILD =="
-cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr DemoClient VxipnpDemo simdmm_64 VisaDemo sim_visa32 qvrq rqengine RQDemo \
-  IviDemo iviconfig ividmm_class simdmm_specific \
-  ExternalProcessServer ExternalDemoClient sessionmgr >"$SM_WINDOWS_BUILD/demo-build.log" 2>&1 ||
-  { cat "$SM_WINDOWS_BUILD/demo-build.log"; exit 1; }
+sm_build demo SessionMgr DemoClient VxipnpDemo simdmm_64 VisaDemo sim_visa32 qvrq rqengine RQDemo IviDemo iviconfig \
+  ividmm_class simdmm_specific ExternalProcessServer ExternalDemoClient sessionmgr
 
 sm_start_wine
 trap sm_stop_wine EXIT

@@ -11,9 +11,7 @@ cycles="${1:-100000}"
 
 sm_install_packages
 sm_configure_windows
-cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target SessionMgr bench_leaks simdmm_64 sim_visa32 qvrq rqengine \
-  iviconfig ividmm_class simdmm_specific >"$SM_WINDOWS_BUILD/leaks-build.log" 2>&1 ||
-  { cat "$SM_WINDOWS_BUILD/leaks-build.log"; exit 1; }
+sm_build leaks SessionMgr bench_leaks simdmm_64 sim_visa32 qvrq rqengine iviconfig ividmm_class simdmm_specific
 sm_start_wine
 trap sm_stop_wine EXIT
 out="$SM_WINDOWS_BUILD/leaks"

@@ -33,6 +33,14 @@ sm_configure_windows() {
       -DCMAKE_TOOLCHAIN_FILE="$SM_ROOT/cmake/mingw-w64-x86_64.cmake" >/dev/null
 }
 
+# sm_build NAME TARGET...: builds these targets of the Windows tree, the log in NAME-build.log
+# there, shown only when the build fails.
+sm_build() {
+  local log="$SM_WINDOWS_BUILD/$1-build.log"
+  shift
+  cmake --build "$SM_WINDOWS_BUILD" -j "$(nproc)" --target "$@" >"$log" 2>&1 || { cat "$log"; return 1; }
+}
+
 # One wineserver for the whole run: without it every Wine program pays the cold start again.
 sm_start_wine() {
   mkdir -p "$WINEPREFIX"
