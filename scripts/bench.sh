@@ -36,12 +36,6 @@ sm_install_sim
 timeout 120 wine regsvr32 /s "$SM_WINDOWS_BUILD/src/server/SessionMgr.dll" >"$out/regsvr32.txt" 2>&1 ||
   { echo "regsvr32 failed"; cat "$out/regsvr32.txt"; exit 1; }
 sm_register_external_server
-# The first activation of the server in a prefix can fail (see sm_warm_external_server): one
-# throw-away forwarded request, then a fresh wineserver.
-SESSIONMGR_WINE_TIMEOUT=120 "$SM_WINDOWS_BUILD/wine-exec" "$SM_WINDOWS_BUILD/bench/bench_external_call.exe" 1 \
-  >"$out/external-warmup.txt" 2>&1 || true
-sm_stop_wine
-sm_start_wine
 
 run_native() {  # name program...
   local name="$1"; shift
