@@ -103,6 +103,14 @@ Object* Find(ViSession handle, Kind kind) {
     return found != objects.end() && found->second.kind == kind ? &found->second : nullptr;
 }
 
+// Runs `use` on the open instrument session vi under the library's lock.
+template <class Use>
+ViStatus WithInstrument(ViSession vi, Use use) {
+    std::lock_guard<std::mutex> guard(lock);
+    Object* instrument = Find(vi, Kind::Instrument);
+    return instrument ? use(*instrument) : ErrorInvalidObject;
+}
+
 // A VISA resource expression: '?' is any one character, '*' repeats the item before it (so "?*" is
 // any text), every other character matches itself without regard to case.
 bool Matches(const char* pattern, const char* text) {
@@ -172,26 +180,32 @@ void Answer(Object& instrument, std::string message) {
 }
 
 ViStatus Write(ViSession vi, const char* data, ViUInt32 count, ViUInt32* written) {
-    std::lock_guard<std::mutex> guard(lock);
     if (written) *written = 0;
-    Object* instrument = Find(vi, Kind::Instrument);
-    if (!instrument) return ErrorInvalidObject;
-    Answer(*instrument, std::string(data, count));
-    if (written) *written = count;
-    return Success;
+    return WithInstrument(vi, [&](Object& instrument) -> ViStatus {
+        Answer(instrument, std::string(data, count));
+        if (written) *written = count;
+        return Success;
+    });
+}
+
+// Writes the printf-formatted message (VI_ERROR_INV_FMT for a format it cannot use).
+ViStatus WriteFormatted(ViSession vi, const char* format, va_list arguments) {
+    char text[4096];
+    int length = std::vsnprintf(text, sizeof text, format, arguments);
+    if (length < 0) return static_cast<ViStatus>(0xBFFF002C);
+    return Write(vi, text, static_cast<ViUInt32>(std::min<int>(length, sizeof text - 1)), nullptr);
 }
 
 // Takes the queued response, without its termination character.
 ViStatus TakeResponse(ViSession vi, std::string& text) {
-    std::lock_guard<std::mutex> guard(lock);
-    Object* instrument = Find(vi, Kind::Instrument);
-    if (!instrument) return ErrorInvalidObject;
-    if (instrument->pending.empty()) return ErrorTimeout;
-    text.swap(instrument->pending);
-    instrument->pending.clear();
-    while (!text.empty() && (text.back() == static_cast<char>(instrument->termChar) || text.back() == '\n'))
-        text.pop_back();
-    return Success;
+    return WithInstrument(vi, [&](Object& instrument) -> ViStatus {
+        if (instrument.pending.empty()) return ErrorTimeout;
+        text.swap(instrument.pending);
+        instrument.pending.clear();
+        while (!text.empty() && (text.back() == static_cast<char>(instrument.termChar) || text.back() == '\n'))
+            text.pop_back();
+        return Success;
+    });
 }
 
 // The number of arguments a printf format takes ('*' widths included), so that a query can pass on
@@ -361,31 +375,27 @@ ViStatus viWrite(ViSession vi, const unsigned char* buffer, ViUInt32 count, ViUI
 ViStatus viRead(ViSession vi, unsigned char* buffer, ViUInt32 count, ViUInt32* read) {
     sim::Count("viRead");
     if (read) *read = 0;
-    std::lock_guard<std::mutex> guard(lock);
-    Object* instrument = Find(vi, Kind::Instrument);
-    if (!instrument) return ErrorInvalidObject;
-    if (instrument->pending.empty()) return ErrorTimeout;
-    std::size_t length = std::min<std::size_t>(count, instrument->pending.size());
-    ViStatus status = length == instrument->pending.size() ? Success : SuccessMaxCount;
-    if (instrument->termCharEnabled) {
-        std::size_t term = instrument->pending.find(static_cast<char>(instrument->termChar));
-        if (term != std::string::npos && term < length) {
-            length = term + 1;
-            status = length == instrument->pending.size() ? Success : SuccessTermChar;
+    return WithInstrument(vi, [&](Object& instrument) -> ViStatus {
+        if (instrument.pending.empty()) return ErrorTimeout;
+        std::size_t length = std::min<std::size_t>(count, instrument.pending.size());
+        ViStatus status = length == instrument.pending.size() ? Success : SuccessMaxCount;
+        if (instrument.termCharEnabled) {
+            std::size_t term = instrument.pending.find(static_cast<char>(instrument.termChar));
+            if (term != std::string::npos && term < length) {
+                length = term + 1;
+                status = length == instrument.pending.size() ? Success : SuccessTermChar;
+            }
         }
-    }
-    std::memcpy(buffer, instrument->pending.data(), length);
-    instrument->pending.erase(0, length);
-    if (read) *read = static_cast<ViUInt32>(length);
-    return status;
+        std::memcpy(buffer, instrument.pending.data(), length);
+        instrument.pending.erase(0, length);
+        if (read) *read = static_cast<ViUInt32>(length);
+        return status;
+    });
 }
 
 ViStatus viVPrintf(ViSession vi, const char* format, va_list arguments) {
     sim::Count("viVPrintf");
-    char text[4096];
-    int length = std::vsnprintf(text, sizeof text, format, arguments);
-    if (length < 0) return static_cast<ViStatus>(0xBFFF002C);
-    return Write(vi, text, static_cast<ViUInt32>(std::min<int>(length, sizeof text - 1)), nullptr);
+    return WriteFormatted(vi, format, arguments);
 }
 
 ViStatus viVScanf(ViSession vi, const char* format, va_list arguments) {
@@ -397,11 +407,8 @@ ViStatus viVQueryf(ViSession vi, const char* writeFormat, const char* readFormat
     sim::Count("viVQueryf");
     va_list writeArguments;
     va_copy(writeArguments, arguments);
-    char text[4096];
-    int length = std::vsnprintf(text, sizeof text, writeFormat, writeArguments);
+    ViStatus status = WriteFormatted(vi, writeFormat, writeArguments);
     va_end(writeArguments);
-    if (length < 0) return static_cast<ViStatus>(0xBFFF002C);
-    ViStatus status = Write(vi, text, static_cast<ViUInt32>(std::min<int>(length, sizeof text - 1)), nullptr);
     if (status != Success) return status;
     for (int skipped = ArgumentCount(writeFormat); skipped > 0; --skipped) (void)va_arg(arguments, void*);
     return Scan(vi, readFormat, arguments);
@@ -433,44 +440,40 @@ ViStatus viQueryf(ViSession vi, const char* writeFormat, const char* readFormat,
 
 ViStatus viClear(ViSession vi) {
     sim::Count("viClear");
-    std::lock_guard<std::mutex> guard(lock);
-    Object* instrument = Find(vi, Kind::Instrument);
-    if (!instrument) return ErrorInvalidObject;
-    instrument->pending.clear();
-    return Success;
+    return WithInstrument(vi, [&](Object& instrument) -> ViStatus {
+        instrument.pending.clear();
+        return Success;
+    });
 }
 
 ViStatus viReadSTB(ViSession vi, ViUInt16* statusByte) {
     sim::Count("viReadSTB");
-    std::lock_guard<std::mutex> guard(lock);
-    Object* instrument = Find(vi, Kind::Instrument);
-    if (!instrument) return ErrorInvalidObject;
-    *statusByte = static_cast<ViUInt16>(Number(sim::Setup::Current(), instrument->resource, "StatusByte", 0));
-    return Success;
+    return WithInstrument(vi, [&](Object& instrument) -> ViStatus {
+        *statusByte = static_cast<ViUInt16>(Number(sim::Setup::Current(), instrument.resource, "StatusByte", 0));
+        return Success;
+    });
 }
 
 ViStatus viSetAttribute(ViObject vi, ViAttr attribute, ViAttrState value) {
-    std::lock_guard<std::mutex> guard(lock);
-    Object* instrument = Find(vi, Kind::Instrument);
-    if (!instrument) return ErrorInvalidObject;
-    switch (attribute) {
-    case AttrTimeout: instrument->timeout = static_cast<ViUInt32>(value); return Success;
-    case AttrTermChar: instrument->termChar = static_cast<ViUInt8>(value); return Success;
-    case AttrTermCharEnabled: instrument->termCharEnabled = value != 0; return Success;
-    default: return ErrorAttributeNotSupported;
-    }
+    return WithInstrument(vi, [&](Object& instrument) -> ViStatus {
+        switch (attribute) {
+        case AttrTimeout: instrument.timeout = static_cast<ViUInt32>(value); return Success;
+        case AttrTermChar: instrument.termChar = static_cast<ViUInt8>(value); return Success;
+        case AttrTermCharEnabled: instrument.termCharEnabled = value != 0; return Success;
+        default: return ErrorAttributeNotSupported;
+        }
+    });
 }
 
 ViStatus viGetAttribute(ViObject vi, ViAttr attribute, void* value) {
-    std::lock_guard<std::mutex> guard(lock);
-    Object* instrument = Find(vi, Kind::Instrument);
-    if (!instrument) return ErrorInvalidObject;
-    switch (attribute) {
-    case AttrTimeout: *static_cast<ViUInt32*>(value) = instrument->timeout; return Success;
-    case AttrTermChar: *static_cast<ViUInt8*>(value) = instrument->termChar; return Success;
-    case AttrTermCharEnabled: *static_cast<ViBoolean*>(value) = instrument->termCharEnabled ? 1 : 0; return Success;
-    default: return ErrorAttributeNotSupported;
-    }
+    return WithInstrument(vi, [&](Object& instrument) -> ViStatus {
+        switch (attribute) {
+        case AttrTimeout: *static_cast<ViUInt32*>(value) = instrument.timeout; return Success;
+        case AttrTermChar: *static_cast<ViUInt8*>(value) = instrument.termChar; return Success;
+        case AttrTermCharEnabled: *static_cast<ViBoolean*>(value) = instrument.termCharEnabled ? 1 : 0; return Success;
+        default: return ErrorAttributeNotSupported;
+        }
+    });
 }
 
 // The rest of the library's entry points exist with their standard signatures; the simulated
