@@ -138,9 +138,10 @@ TEST_F(Registration, WritesEveryKeyOfTheTableAndReplacesClassKeysWhole) {
 TEST_F(Registration, HeldClassObjectKeepsTheModuleLoaded) {
     HRESULT before = Call("DllCanUnloadNow");
     ComPtr<IClassFactory> factory;
-    ASSERT_EQ(GetProcAddressAs<HRESULT STDAPICALLTYPE(REFCLSID, REFIID, void**)>(module.Get(), "DllGetClassObject")(
-                  CLSID_CustomInstrSession, IID_IClassFactory, factory.PutVoid()),
-              S_OK);
+    auto getClassObject = GetProcAddressAs<HRESULT STDAPICALLTYPE(REFCLSID, REFIID, void**)>(module.Get(), "DllGetClassObject");
+    // The manager makes VISA sessions; no class object may hand them out.
+    EXPECT_EQ(getClassObject(CLSID_VisaInstrSession, IID_IClassFactory, factory.PutVoid()), CLASS_E_CLASSNOTAVAILABLE);
+    ASSERT_EQ(getClassObject(CLSID_CustomInstrSession, IID_IClassFactory, factory.PutVoid()), S_OK);
     EXPECT_EQ(Call("DllCanUnloadNow"), S_FALSE);
     factory.Reset();
     EXPECT_EQ(Call("DllCanUnloadNow"), before);

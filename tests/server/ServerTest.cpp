@@ -59,16 +59,6 @@ TEST(ClassObjects, SessionClassesAggregateOnlyAskedForIUnknownAndWorkWithoutAMan
     outer.inner.Reset();
 }
 
-// The manager makes VISA sessions; no class object may hand them out.
-TEST(ClassObjects, VisaSessionsHaveNoClassObject) {
-    auto getClassObject = GetProcAddressAs<HRESULT STDAPICALLTYPE(REFCLSID, REFIID, void**)>(
-        ::GetModuleHandleA("SessionMgr.dll"), "DllGetClassObject");
-    ASSERT_NE(getClassObject, nullptr);
-    ComPtr<IClassFactory> factory;
-    EXPECT_EQ(getClassObject(CLSID_VisaInstrSession, IID_IClassFactory, factory.PutVoid()), CLASS_E_CLASSNOTAVAILABLE);
-    EXPECT_EQ(getClassObject(CLSID_CustomInstrSession, IID_IClassFactory, factory.PutVoid()), S_OK);
-}
-
 TEST(Unloading, OnlyTheFactoryHoldingTheManagerLetsTheDllGo) {
     {
         auto manager = CreateManager();
