@@ -9,6 +9,7 @@
 #include <cstdio>
 #include <fstream>
 #include <iterator>
+#include <map>
 #include <sstream>
 #include <string>
 
@@ -49,16 +50,12 @@ std::string TypeText(ITypeInfo* context, const TYPEDESC& type) {
             context->GetRefTypeInfo(type.hreftype, referenced.Put());
             return referenced ? NameOf(referenced.Get()) : "<unresolved>";
         }
-        case VT_I2: return "short";
-        case VT_I4: return "long";
-        case VT_R8: return "double";
-        case VT_BSTR: return "BSTR";
-        case VT_BOOL: return "VARIANT_BOOL";
-        case VT_VARIANT: return "VARIANT";
-        case VT_UNKNOWN: return "IUnknown*";
-        case VT_HRESULT: return "HRESULT";
-        default: return "vt" + std::to_string(type.vt);
+        default: break;
     }
+    static const std::map<VARTYPE, std::string> names{{VT_I2, "short"}, {VT_I4, "long"}, {VT_R8, "double"},
+        {VT_BSTR, "BSTR"}, {VT_BOOL, "VARIANT_BOOL"}, {VT_VARIANT, "VARIANT"}, {VT_UNKNOWN, "IUnknown*"}, {VT_HRESULT, "HRESULT"}};
+    auto known = names.find(type.vt);
+    return known != names.end() ? known->second : "vt" + std::to_string(type.vt);
 }
 
 void DumpMembers(ITypeInfo* info, const TYPEATTR& attributes, std::ostream& out) {
