@@ -8,13 +8,6 @@
 using namespace sm;
 using namespace sm::testing;
 
-// Catches an empty text handed to clients as a null BSTR (scripts read it as Empty, not "").
-TEST(BstrConversion, EmptyIsANonNullBstr) {
-    UniqueBstr empty(AllocSysString(""));
-    ASSERT_NE(empty.Get(), nullptr);
-    EXPECT_EQ(::SysStringLen(empty.Get()), 0u);
-}
-
 TEST_F(DoubleByteCodePage, BstrConversionUsesTheProcessCodePage) {
     // Shift-JIS 0x82 0xA0 is HIRAGANA LETTER A (U+3042).
     UniqueBstr wide(AllocSysString("\x82\xA0"));

@@ -89,7 +89,7 @@ IUnknown* IdentityOf(Interface* object) {
 }
 
 // Arguments of a late-bound call in declaration order, freed when done; a reference argument points
-// at the caller's variable, which keeps what the call puts there.
+// at the caller's variable.
 class Arguments {
 public:
     Arguments() = default;

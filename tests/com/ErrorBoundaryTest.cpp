@@ -38,14 +38,6 @@ TEST(ErrorBoundary, AnythingElseIsOperationFailed) {
     sm::testing::ExpectComError(result, sm::testing::operationFailed, "Operation Failed.", testClass);
 }
 
-TEST(ErrorBoundary, EmptyDescriptionSetsNoText) {
-    HRESULT result = SetComErrorInfo(testClass, -5, "");
-    EXPECT_EQ(result, static_cast<HRESULT>(-5));
-    auto reported = TakeErrorInfo();
-    ASSERT_TRUE(reported.present);
-    EXPECT_EQ(reported.description, "");
-}
-
 // Fault: std::bad_alloc (a failed session creation among others) reached clients as -17500
 // "Operation Failed." instead of E_OUTOFMEMORY.
 TEST(ErrorBoundary, OutOfMemoryReachesTheClientAsEOutOfMemory) {
