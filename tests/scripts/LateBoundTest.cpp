@@ -36,13 +36,6 @@ protected:
 };
 }  // namespace
 
-TEST_F(LateBound, TextArraysArriveAsArraysOfBstr) {
-    LateResult categories = Invoke(manager.Get(), L"GetCategories", DISPATCH_METHOD, Arguments().Text(L""));
-    ASSERT_EQ(categories.result, S_OK) << categories.description;
-    ASSERT_EQ(categories.value->vt, VT_ARRAY | VT_BSTR);
-    EXPECT_EQ(ReadTexts(categories.value->parray), (std::vector<std::string>{"IVI", "VISA", "VXIPNP", "CUSTOM"}));
-}
-
 TEST_F(LateBound, SessionArraysHoldDispatchPointersWithTheirOwnReferences) {
     auto session = Session(L"CUSTOM::Scripted");
     ASSERT_TRUE(session);

@@ -1,7 +1,5 @@
-' The session manager as a late-bound VBScript client meets it, for what only a script shows: creation
-' by ProgID, object identity, Err.Number and Err.Description, hidden and restricted members, omitted
-' optional arguments, For Each, property puts. The decisions behind the calls are tested early-bound.
-' Run by run-script.sh, which needs the closing "fails=0" line.
+' A late-bound VBScript client, for what only a script shows (ProgIDs, identity, Err, hidden and restricted
+' members, omitted optional arguments, For Each, property puts). run-script.sh needs the "fails=0" line.
 Option Explicit
 
 Dim failCount, checkCount
@@ -10,10 +8,7 @@ checkCount = 0
 
 Sub Report(passed, what)
     checkCount = checkCount + 1
-    If Not passed Then
-        failCount = failCount + 1
-        WScript.Echo "FAIL: " & what
-    End If
+    If Not passed Then failCount = failCount + 1 : WScript.Echo "FAIL: " & what
 End Sub
 
 ' A failed statement is skipped under On Error Resume Next, so every check first looks at Err.
