@@ -9,7 +9,6 @@
 #include "ComTestSupport.h"
 
 using namespace sm;
-using sm::testing::TakeErrorInfo;
 
 namespace {
 const ::testing::Environment* const apartment =

@@ -1,6 +1,8 @@
 // The manager answers the plain late-bound GetInstrSession itself, as the type library's dispatch would.
 #include <gtest/gtest.h>
 
+#include <tuple>
+
 #include "com/ComClient.h"
 
 namespace {
