@@ -66,7 +66,7 @@ std::vector<Element> ReadSafeArray(SAFEARRAY* array, VARTYPE elementType) {
     if (!array) return elements;
     EXPECT_EQ(::SafeArrayGetDim(array), 1u);
     VARTYPE type = elementType;
-    if (elementType != VT_EMPTY) EXPECT_TRUE(::SafeArrayGetVartype(array, &type) == S_OK && type == elementType) << type;
+    if (elementType != VT_EMPTY) { EXPECT_TRUE(::SafeArrayGetVartype(array, &type) == S_OK && type == elementType) << type; }
     LONG lower = -1, upper = -2;
     ::SafeArrayGetLBound(array, 1, &lower);
     ::SafeArrayGetUBound(array, 1, &upper);

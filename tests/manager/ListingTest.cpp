@@ -179,7 +179,6 @@ TEST_F(Listing, HidingTakesACategoryOutOfEveryListingButNotItsSessions) {
 }
 
 TEST_F(Listing, StateTextOfTheConfigurationAndTheSessions) {
-    // The configuration's own text is the sources' (see the configuration file's tests).
     EXPECT_EQ(StateOf(manager.Get()).rfind("In Process State:\nVXIPNP Configuration:\n", 0), 0u);
     for (const wchar_t* category : {L"VXIPNP", L"IVI", L"VISA"}) Hide(category, true);
     EXPECT_EQ(StateOf(manager.Get()), "In Process State:\n\nNumber of Sessions:0\n");

@@ -34,8 +34,9 @@ void ExpectSameAnswer(IInstrSessionMgr* manager, const wchar_t* name) {
     EXPECT_EQ(std::tie(quick.result, quick.code, quick.description, quick.value->vt),
               std::tie(typeLibrary.result, typeLibrary.code, typeLibrary.description, typeLibrary.value->vt))
         << Text(Bstr(name).Get());
-    if (quick.value->vt == VT_DISPATCH && typeLibrary.value->vt == VT_DISPATCH)
-        EXPECT_EQ(IdentityOf(quick.value->pdispVal), IdentityOf(typeLibrary.value->pdispVal));
+    IDispatch* quickSession = quick.value->vt == VT_DISPATCH ? quick.value->pdispVal : nullptr;  // null after a failure
+    IDispatch* typeLibrarySession = typeLibrary.value->vt == VT_DISPATCH ? typeLibrary.value->pdispVal : nullptr;
+    EXPECT_EQ(quickSession ? IdentityOf(quickSession) : nullptr, typeLibrarySession ? IdentityOf(typeLibrarySession) : nullptr);
 }
 
 // Fault caught: the quick path handed back another variant type or session than the type library
