@@ -31,17 +31,14 @@ inline ComPtr<IInstrSession> GetSession(IInstrSessionMgr* manager, const wchar_t
     return session;
 }
 
-inline std::string NameOf(IInstrSession* session) {
-    UniqueBstr name;
-    EXPECT_EQ(session->get_Name(name.Put()), S_OK);
-    return Text(name.Get());
+// A text property of a session; fails the test on an error.
+inline std::string TextOf(IInstrSession* session, HRESULT (STDMETHODCALLTYPE IInstrSession::*get)(BSTR*)) {
+    UniqueBstr text;
+    EXPECT_EQ((session->*get)(text.Put()), S_OK);
+    return Text(text.Get());
 }
-
-inline std::string CategoryOf(IInstrSession* session) {
-    UniqueBstr category;
-    EXPECT_EQ(session->get_Category(category.Put()), S_OK);
-    return Text(category.Get());
-}
+inline std::string NameOf(IInstrSession* session) { return TextOf(session, &IInstrSession::get_Name); }
+inline std::string CategoryOf(IInstrSession* session) { return TextOf(session, &IInstrSession::get_Category); }
 
 // A call as a client sees it: the HRESULT and the error text it left (empty without error info).
 using Answer = std::pair<unsigned long, std::string>;
@@ -92,7 +89,7 @@ IUnknown* IdentityOf(Interface* object) {
 }
 
 // Arguments of a late-bound call in declaration order, freed when done; a reference argument points
-// at the caller's variable, which keeps what the call puts there.
+// at the caller's variable.
 class Arguments {
 public:
     Arguments() = default;
@@ -102,12 +99,6 @@ public:
         for (VARIANT& value : values) ::VariantClear(&value);
     }
     Arguments& Text(const wchar_t* text) { return Add(VT_BSTR).bstrVal = ::SysAllocString(text), *this; }
-    // Any UTF-16, embedded NULs included.
-    Arguments& Text(const std::wstring& text) {
-        return Add(VT_BSTR).bstrVal = ::SysAllocStringLen(text.data(), static_cast<UINT>(text.size())), *this;
-    }
-    // An argument of that type with no value (VT_NULL, VT_UNKNOWN with a null pointer, ...).
-    Arguments& Null(VARTYPE type) { return Add(type), *this; }
     Arguments& Long(LONG number) { return Add(VT_I4).lVal = number, *this; }
     Arguments& Double(double number) { return Add(VT_R8).dblVal = number, *this; }
     Arguments& Bool(bool flag) { return Add(VT_BOOL).boolVal = flag ? VARIANT_TRUE : VARIANT_FALSE, *this; }

@@ -1,10 +1,6 @@
-// IVI on machines whose configuration library is missing, cannot open its store, or is an older
-// version without the class-count functions. The library is loaded once per process and kept, so
-// the cases run in this order in one program: the library hidden (nothing is retained after the
-// failed load), then a store that cannot be opened, then the older library.
-//
-// Hiding renames the installed library in the prefix's system directory for the first case only;
-// ctest runs this program under the lock that every COM test holds, so no other test sees it gone.
+// IVI without its configuration library, with a store that cannot be opened, and with an older library
+// lacking the class-count functions. The library is loaded once per process and kept, so the cases run
+// in this order. Hiding renames the installed library; ctest holds the COM tests' lock meanwhile.
 #include "SimBench.h"
 #include "com/ComClient.h"
 
@@ -37,7 +33,6 @@ TEST(IviInstallation, WithoutTheLibraryEveryIviListingFailsNamingItsPath) {
     auto [code, message] = AnswerOf(manager->GetNames(Bstr(L"").Get(), ReturnVirtualInstruments, Bstr(L"").Get(), names.Put()));
     EXPECT_EQ(code, 0xFFFFBD94);
     EXPECT_EQ(message.rfind("Could not load DLL or external library '" + hidden.path + "'.\nWin32 Error Code = '126'\n", 0), 0u);
-    EXPECT_EQ(static_cast<unsigned long>(manager->GetCategories(Bstr(L"IVI").Get(), names.Put())), 0xFFFFBD94);
 }
 
 TEST(IviInstallation, AStoreThatCannotBeOpenedIsReportedAndTriedAgain) {

@@ -1,8 +1,5 @@
-// The manager's listings through its vtable over a VXIplug&play configuration: names, live sessions,
-// categories, hiding a category, the state text, and the same listings from another apartment.
-//
-// The manager is one object per process and its hidden flags outlive a test, so every test starts
-// and ends with every category visible and releases the sessions it made.
+// The manager's listings through its vtable over a VXIplug&play configuration, also from another
+// apartment. The manager and its hidden flags outlive a test: each test ends with every category visible.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -22,8 +19,7 @@ const ::testing::Environment* const apartment = ::testing::AddGlobalTestEnvironm
 constexpr LONG logicalAndVirtual = ReturnLogicalNames | ReturnVirtualInstruments;
 using Texts = std::vector<std::string>;
 
-// Two virtual instruments, one with a logical name. The directory is resolved once per process,
-// before the first manager exists, so it is set up while the program starts.
+// Two virtual instruments, one with a logical name; set up at start, before the directory is resolved.
 const std::string configurationFile = UseConfigurationFile("SessionMgrListingTest",
     "[VXIPNP Logical Names]\nDMM1 = \"VPPVInstr->Fluke\"\n"
     "[VPPVInstr->Fluke]\nModulePath = \"fl45_64.dll\"\nPrefix = \"fl45\"\nResource = \"GPIB::14::INSTR\"\nIDQuery = True\nReset = True\n"
@@ -71,13 +67,9 @@ protected:
                        unrecognizedValue, "'" + quoted + "' is not a driver session category", CLSID_InstrSessionMgr);
         EXPECT_EQ(output, nullptr);
     }
-    void ExpectNamesError(const wchar_t* category, const std::string& quoted) { ExpectCategoryError(true, category, quoted); }
-    void ExpectCategoriesError(const wchar_t* base, const std::string& quoted) { ExpectCategoryError(false, base, quoted); }
     ComPtr<IInstrSessionMgr> manager;
 };
 }  // namespace
-
-// ---- GetNames -----------------------------------------------------------------------------------
 
 TEST_F(Listing, NamesForEveryFormOfTheCategoryArgument) {
     // The whole list is each source's list in a fixed order, the VXIplug&play names last.
@@ -91,16 +83,7 @@ TEST_F(Listing, NamesForEveryFormOfTheCategoryArgument) {
     // Categories without configured names answer with an empty array, not an error.
     for (const wchar_t* empty : {L"DAQ", L"CUSTOM", L"daq", L" Custom "})
         EXPECT_EQ(Names(empty), Texts{}) << Text(Bstr(empty).Get());
-    ExpectNamesError(L"  FOO\t", "FOO");
-    ExpectNamesError(L"foo", "foo");
-}
-
-// Which names each option and filter selects is the sources' decision: here only that they arrive.
-TEST_F(Listing, OptionsPrefixAndFiltersReachTheSource) {
-    EXPECT_EQ(Names(L"VXIPNP", ReturnVirtualInstruments), (Texts{"Fluke", "Scope"}));
-    EXPECT_EQ(Names(L"vxipnp", logicalAndVirtual | IncludeCategoryPrefix),
-              (Texts{"VXIPNP::Fluke", "VXIPNP::DMM1", "VXIPNP::Scope"}));
-    EXPECT_EQ(Names(L"VXIPNP", logicalAndVirtual, L"SpecificPrefix = SC"), Texts{"Scope"});
+    ExpectCategoryError(true, L"  FOO\t", "FOO");
 }
 
 TEST_F(Listing, ExternalManagerMarksNamesListedForThePrefixedCategory) {
@@ -109,27 +92,20 @@ TEST_F(Listing, ExternalManagerMarksNamesListedForThePrefixedCategory) {
     EXPECT_EQ(Names(L"*VXIPNP", ReturnLogicalNames), Texts{"*DMM1"});
     EXPECT_EQ(Names(L" *vxipnp ", ReturnLogicalNames | IncludeCategoryPrefix), Texts{"*VXIPNP::DMM1"});
     EXPECT_EQ(Names(L"VXIPNP", ReturnLogicalNames), Texts{"DMM1"});
-    EXPECT_EQ(Categories(L"*"), (Texts{"IVI", "VISA", "VXIPNP", "CUSTOM"}));
-    ExpectNamesError(L"*FOO", "FOO");
     auto session = GetSession(manager.Get(), L"CUSTOM::Shared");
     EXPECT_EQ(Sessions(L"*CUSTOM"), IdentitiesOf({session.Get()}));
 }
 
-// ---- GetSessions --------------------------------------------------------------------------------
-
 TEST_F(Listing, SessionsByCategoryInCreationOrder) {
-    EXPECT_EQ(Sessions(L""), std::vector<IUnknown*>{});
     auto first = GetSession(manager.Get(), L"CUSTOM::First");
     auto route = GetSession(manager.Get(), L"RQ::Route1");
     auto lower = GetSession(manager.Get(), L"custom::Lower");
     auto scope = GetSession(manager.Get(), L"VXIPNP::Scope");
     auto last = GetSession(manager.Get(), L"CUSTOM::Last");
-    ASSERT_TRUE(first && route && lower && scope && last);
     EXPECT_EQ(Sessions(L"?"), IdentitiesOf({first.Get(), route.Get(), lower.Get(), scope.Get(), last.Get()}));
     for (const wchar_t* custom : {L"CUSTOM", L" custom ", L"CUSTOM::"})
         EXPECT_EQ(Sessions(custom), IdentitiesOf({first.Get(), lower.Get(), last.Get()}));
     EXPECT_EQ(Sessions(L"rq"), IdentitiesOf({route.Get()}));
-    EXPECT_EQ(Sessions(L"vxipnp"), IdentitiesOf({scope.Get()}));
     // No session of these: empty arrays, and no category check for a session listing.
     for (const wchar_t* none : {L"VISA", L"DAQ", L"FOO", L"CUSTOM::Sub", L"FOO::BAR"})
         EXPECT_EQ(Sessions(none), std::vector<IUnknown*>{}) << Text(Bstr(none).Get());
@@ -150,7 +126,6 @@ TEST_F(Listing, EachListedSessionHoldsItsOwnReference) {
     ASSERT_EQ(elements.size(), 2u);
     auto held = elements[0].As<IInstrSession>();
     EXPECT_EQ(NameOf(held.Get()), "HeldOne");
-    EXPECT_EQ(held->AttachLong(Bstr(L"Still").Get(), 1), S_OK);
     held.Reset();
     elements.clear();
     EXPECT_EQ(Sessions(L"CUSTOM").size(), 2u);
@@ -158,17 +133,14 @@ TEST_F(Listing, EachListedSessionHoldsItsOwnReference) {
     EXPECT_EQ(Sessions(L"CUSTOM").size(), 0u);
 }
 
-// ---- GetCategories and HideCategory -------------------------------------------------------------
-
 TEST_F(Listing, CategoriesTopLevelLeavesAndErrors) {
     for (const wchar_t* anyForm : {L"", L"?", L"  ", L"FOO::BAR", L"::"})
         EXPECT_EQ(Categories(anyForm), (Texts{"IVI", "VISA", "VXIPNP", "CUSTOM"})) << Text(Bstr(anyForm).Get());
     for (const wchar_t* leaf : {L"DAQ", L"VISA", L"VXIPNP", L"CUSTOM", L"visa", L" Custom ", L"VISA::x"})
         EXPECT_EQ(Categories(leaf), Texts{}) << Text(Bstr(leaf).Get());
     // The whole trimmed argument is quoted; the switch category has no list.
-    ExpectCategoriesError(L"rq", "rq");
-    ExpectCategoriesError(L" RQ::Route1 ", "RQ::Route1");
-    ExpectCategoriesError(L"\tFOO  ", "FOO");
+    ExpectCategoryError(false, L" RQ::Route1 ", "RQ::Route1");
+    ExpectCategoryError(false, L"\tFOO  ", "FOO");
 }
 
 TEST_F(Listing, HideCategoryTakesTheFiveHideableTokensInAnyForm) {
@@ -176,13 +148,9 @@ TEST_F(Listing, HideCategoryTakesTheFiveHideableTokensInAnyForm) {
         Hide(token, true), Hide(token, false);
     Hide(L"VISA", true);
     EXPECT_EQ(Categories(L""), (Texts{"IVI", "VXIPNP", "CUSTOM"}));
-    ExpectCategoriesError(L"VISA", "VISA");
-    Hide(L"*ivi", true);
-    EXPECT_EQ(Categories(L""), (Texts{"VXIPNP", "CUSTOM"}));
-    Hide(L"DAQ", true);
-    ExpectCategoriesError(L"DAQ", "DAQ");
-    Hide(L"VXIPNP", true);
-    Hide(L"CUSTOM", true);
+    ExpectCategoryError(false, L"VISA", "VISA");
+    for (const wchar_t* token : {L"DAQ", L"*ivi", L"VXIPNP", L"CUSTOM"}) Hide(token, true);
+    ExpectCategoryError(false, L"DAQ", "DAQ");
     EXPECT_EQ(Categories(L""), Texts{});
     Hide(L" *custom ", false);
     EXPECT_EQ(Categories(L""), Texts{"CUSTOM"});
@@ -202,29 +170,16 @@ TEST_F(Listing, HidingTakesACategoryOutOfEveryListingButNotItsSessions) {
     Hide(L"VXIPNP", true);
     Texts all = Names(L"");
     EXPECT_EQ(std::find(all.begin(), all.end(), "DMM1"), all.end());
-    ExpectNamesError(L"VXIPNP", "VXIPNP");
+    ExpectCategoryError(true, L"VXIPNP", "VXIPNP");
     // With the category gone, "VXIPNP::x" is just a name in the search over all categories.
     EXPECT_EQ(Names(L"VXIPNP::x"), all);
     EXPECT_EQ(Categories(L""), (Texts{"IVI", "VISA", "CUSTOM"}));
-    // The live session is untouched: listed, described, found by its bare name, working.
+    // The live session is untouched (found by its bare name and working: see the manager's tests).
     EXPECT_EQ(Sessions(L"VXIPNP"), IdentitiesOf({scope.Get()}));
-    Hide(L"IVI", true), Hide(L"VISA", true);
-    EXPECT_EQ(StateOf(manager.Get()), "In Process State:\n\nNumber of Sessions:1\n   Session #0\n   Name: Scope, "
-                                      "Category: VXIPNP\nName List: Scope (VirtualInstrumentName)\n      Initialized: "
-                                      "False, Loaded: False, In Process, Module Path: sc_64.dll\n");
-    EXPECT_EQ(GetSession(manager.Get(), L"Scope").Get(), scope.Get());
-    EXPECT_EQ(scope->AttachLong(Bstr(L"Kept").Get(), 7), S_OK);
-    Hide(L"VXIPNP", false);
-    EXPECT_EQ(Names(L"VXIPNP"), configured);
 }
 
-// ---- StateDescription ---------------------------------------------------------------------------
-
 TEST_F(Listing, StateTextOfTheConfigurationAndTheSessions) {
-    std::string text = StateOf(manager.Get());
-    EXPECT_EQ(text.rfind("In Process State:\nVXIPNP Configuration:\n   Session Manager configuration file: " +
-                             configurationFile + ", Number of sections: 3\n", 0), 0u) << text;
-    EXPECT_NE(text.find("   Number of virtual instruments = 2\n"), std::string::npos);
+    EXPECT_EQ(StateOf(manager.Get()).rfind("In Process State:\nVXIPNP Configuration:\n", 0), 0u);
     for (const wchar_t* category : {L"VXIPNP", L"IVI", L"VISA"}) Hide(category, true);
     EXPECT_EQ(StateOf(manager.Get()), "In Process State:\n\nNumber of Sessions:0\n");
 
@@ -238,8 +193,7 @@ TEST_F(Listing, StateTextOfTheConfigurationAndTheSessions) {
     EXPECT_EQ(StateOf(manager.Get()), head + "1\n" + benchText);
 }
 
-// Callers on threads of a single-threaded apartment reach the manager through a proxy built from the
-// registered type library, session arrays included.
+// Single-threaded callers reach the manager through a proxy from the registered type library.
 TEST_F(Listing, ListingsCrossApartmentsThroughTheRegisteredTypeLibrary) {
     auto session = GetSession(manager.Get(), L"CUSTOM::Marshalled");
     Texts names = Names(L"");

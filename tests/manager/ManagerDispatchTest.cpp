@@ -1,6 +1,7 @@
-// The manager answers the plain late-bound GetInstrSession itself: what it answers must be what the
-// type library's dispatch answers for the same call.
+// The manager answers the plain late-bound GetInstrSession itself, as the type library's dispatch would.
 #include <gtest/gtest.h>
+
+#include <tuple>
 
 #include "com/ComClient.h"
 
@@ -30,17 +31,12 @@ void ExpectSameAnswer(IInstrSessionMgr* manager, const wchar_t* name) {
     arguments.Text(name).Bool(false);
     LateResult quick = Invoke(manager, L"GetInstrSession", DISPATCH_METHOD, arguments);
     LateResult typeLibrary = TypeLibraryInvoke(manager, arguments);
-    EXPECT_EQ(quick.result, typeLibrary.result) << Text(Bstr(name).Get());
-    EXPECT_EQ(quick.code, typeLibrary.code);
-    EXPECT_EQ(quick.description, typeLibrary.description);
-    ASSERT_EQ(quick.value.Get()->vt, typeLibrary.value.Get()->vt);
-    if (quick.value.Get()->vt != VT_DISPATCH) return;
-    IDispatch* quickSession = quick.value.Get()->pdispVal;
-    IDispatch* typeLibrarySession = typeLibrary.value.Get()->pdispVal;
-    ASSERT_EQ(quickSession == nullptr, typeLibrarySession == nullptr);
-    if (quickSession) {
-        EXPECT_EQ(IdentityOf(quickSession), IdentityOf(typeLibrarySession));
-    }
+    EXPECT_EQ(std::tie(quick.result, quick.code, quick.description, quick.value->vt),
+              std::tie(typeLibrary.result, typeLibrary.code, typeLibrary.description, typeLibrary.value->vt))
+        << Text(Bstr(name).Get());
+    IDispatch* quickSession = quick.value->vt == VT_DISPATCH ? quick.value->pdispVal : nullptr;  // null after a failure
+    IDispatch* typeLibrarySession = typeLibrary.value->vt == VT_DISPATCH ? typeLibrary.value->pdispVal : nullptr;
+    EXPECT_EQ(quickSession ? IdentityOf(quickSession) : nullptr, typeLibrarySession ? IdentityOf(typeLibrarySession) : nullptr);
 }
 
 // Fault caught: the quick path handed back another variant type or session than the type library

@@ -1,12 +1,8 @@
 #!/bin/sh
-# Runs one VBScript file under Wine's cscript and decides pass or fail from its output.
-#
-#   run-script.sh WINE_EXEC SCRIPT OUTPUT
-#
-# WINE_EXEC is the build's wine-exec wrapper (private prefix, timeout). cscript exits 0 on a syntax or
-# runtime error and prints nothing about it, so its exit code proves nothing: a script passes only when
-# it printed the line "fails=0" and no line starting with "FAIL". The output goes to a file (a Wine
-# program's output is never piped) and is printed afterwards for ctest's log.
+# run-script.sh WINE_EXEC SCRIPT OUTPUT: runs one VBScript file under Wine's cscript (through the
+# build's wine-exec wrapper) and decides pass or fail from its output. cscript exits 0 on a syntax or
+# runtime error, so a script passes only when it printed "fails=0" and no line starting with "FAIL".
+# The output goes to a file (a Wine program's output is never piped) and is printed for ctest's log.
 set -u
 wine_exec="$1"
 script="$2"
@@ -19,15 +15,8 @@ SESSIONMGR_WINE_TIMEOUT=120 "$wine_exec" cscript //nologo "$winpath" >"$output" 
 status=$?
 tr -d '\r' <"$output"
 
-if [ "$status" -ne 0 ]; then
-  echo "FAIL: cscript exited with $status (124: timed out)"
-  exit 1
-fi
-if tr -d '\r' <"$output" | grep -q '^FAIL'; then
-  echo "FAIL: the script reported failures"
-  exit 1
-fi
-if ! tr -d '\r' <"$output" | grep -qx 'fails=0'; then
-  echo "FAIL: no 'fails=0' line: the script stopped early (syntax error, or a runtime error outside On Error Resume Next)"
-  exit 1
-fi
+fail() { echo "FAIL: $1"; exit 1; }
+[ "$status" -eq 0 ] || fail "cscript exited with $status (124: timed out)"
+! tr -d '\r' <"$output" | grep -q '^FAIL' || fail "the script reported failures"
+tr -d '\r' <"$output" | grep -qx 'fails=0' ||
+  fail "no 'fails=0' line: the script stopped early (syntax error, or a runtime error outside On Error Resume Next)"

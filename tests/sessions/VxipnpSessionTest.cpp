@@ -1,6 +1,5 @@
-// VXIplug&play sessions and IVPPBase through the registered DLL, over the simulated drivers copied
-// into a private VXIplug&play directory. The simdmm driver is pinned by the test (one extra
-// LoadLibrary) so that its counters survive the product freeing it.
+// VXIplug&play sessions and IVPPBase over simulated drivers copied into a private directory. The test
+// pins simdmm (one extra LoadLibrary) so that its counters survive the product freeing it.
 #include <gtest/gtest.h>
 
 #include <string>
@@ -32,10 +31,9 @@ const std::string bin = [] {
                              instrument("WarnDMM", "simdmm", "GPIB0::15::INSTR") +
                              instrument("AbsentDMM", "simdmm", "GPIB0::99::INSTR") +
                              instrument("NoClose", "simnoclose", "GPIB0::14::INSTR") +
-                             instrument("NoVpp", "simnovpp", "GPIB0::14::INSTR") +
                              instrument("Missing", "absent", "GPIB0::14::INSTR"));
     ::CreateDirectoryA(bin.c_str(), nullptr);
-    for (std::string driver : {SIM_SIMDMM, SIM_SIMNOCLOSE, SIM_SIMNOVPP})
+    for (std::string driver : {SIM_SIMDMM, SIM_SIMNOCLOSE})
         ::CopyFileA(driver.c_str(), (bin + "\\" + driver.substr(driver.find_last_of("/\\") + 1)).c_str(), FALSE);
     UseSimSetup("vxipnpsession",
                 "[VXIPNP Resource GPIB0::14::INSTR]\nSession = 0x1401\n"
@@ -90,14 +88,10 @@ TEST_F(VxipnpSession, HandleLevelsAndReinitAfterClose) {
     EXPECT_EQ(std::make_pair(handleEx->vt, handleEx->lVal), std::make_pair(VARTYPE(VT_I4), 0x1401L));
     LONG handle = 5;
     ExpectError(session->GetHandle(ClassDriver, &handle), 0xFFFFBC6C, "Value invalid or out of range.");
-    EXPECT_EQ(session->GetHandle(static_cast<InterfaceLevel>(7), &handle), S_OK);
-    EXPECT_EQ(handle, 0);
     EXPECT_EQ(Count("init"), 1);
 
     ASSERT_EQ(session->Close(), S_OK);
     EXPECT_EQ(Count("close"), 1);
-    EXPECT_NE(StateOf(session.Get()).find("      Initialized: False, Loaded: True, In Process, Module Path: " + simdmmPath),
-              std::string::npos);
     ASSERT_EQ(session->GetHandle(DefaultInterface, &handle), S_OK);
     EXPECT_EQ(handle, 0x1401);
     EXPECT_EQ(Count("init"), 2);
@@ -110,16 +104,11 @@ TEST_F(VxipnpSession, WarningOpensFailureRaisesItsStatusAndKeepsTheDriverLoaded)
 
     auto absent = GetSession(manager.Get(), L"VXIPNP::AbsentDMM");
     ExpectError(absent->Initialize(nullptr), resourceNotFound, "simdmm_init returned an error: -1073807343 (0xbfff0011).");
-    EXPECT_NE(StateOf(absent.Get()).find("Initialized: False, Loaded: True"), std::string::npos);
+    EXPECT_NE(StateOf(absent.Get()).find("      Initialized: False, Loaded: True, In Process, Module Path: " + simdmmPath),
+              std::string::npos);
 }
 
 TEST_F(VxipnpSession, LibraryFailuresAreReportedAndLeaveNothingLoaded) {
-    auto missing = GetSession(manager.Get(), L"VXIPNP::Missing");
-    auto [code, message] = AnswerOf(missing->Initialize(nullptr));
-    EXPECT_EQ(code, 0xFFFFBD94);
-    EXPECT_EQ(message.rfind("Could not load DLL or external library '" + bin + "\\absent_64.dll'.\nWin32 Error Code = '126'\n", 0),
-              0u) << message;
-
     auto noClose = GetSession(manager.Get(), L"VXIPNP::NoClose");
     ExpectError(noClose->Initialize(nullptr), 0xFFFFBD93,
                 "Could not find function 'simnoclose_close' in DLL (or external module) '" + bin + "\\simnoclose_64.dll'.");
@@ -137,25 +126,6 @@ TEST_F(VxipnpSession, FailedLoadKeepsReleaseOnCloseItems) {
     EXPECT_TRUE(kept);
 }
 
-TEST_F(VxipnpSession, HandlesAreRefusedOutsideTheirProcess) {
-    auto session = GetSession(manager.Get(), L"DMM1");
-    ASSERT_EQ(session->put_InExternalProcess(VARIANT_TRUE), S_OK);
-    UniqueVariant handle;
-    ExpectError(session->GetHandleEx(DefaultInterface, handle.Get()), 0xFFFFBBA4,
-                "VXI-PNP instrument handles cannot be used outside of the operating system process that they are "
-                "created in.");
-    EXPECT_EQ(Count("init"), 0);
-}
-
-TEST_F(VxipnpSession, DestructionClosesAndFreesTheDriver) {
-    auto session = GetSession(manager.Get(), L"DMM1");
-    ASSERT_EQ(session->Initialize(nullptr), S_OK);
-    session.Reset();
-    EXPECT_EQ(Count("close"), 1);
-    pinned.Reset();
-    EXPECT_EQ(::GetModuleHandleA("simdmm_64.dll"), nullptr);  // the product's own reference is gone too
-}
-
 TEST_F(VxipnpSession, StandardFunctionsAnswerWithTheDriversResults) {
     auto session = GetSession(manager.Get(), L"DMM1");
     ComPtr<IVPPBase> first, second;
@@ -164,26 +134,17 @@ TEST_F(VxipnpSession, StandardFunctionsAnswerWithTheDriversResults) {
     EXPECT_NE(first.Get(), second.Get());
 
     LONG code = 0, status = 0;
-    UniqueBstr text, firmware;
+    UniqueBstr text;
     EXPECT_EQ(first->Error_Query(&code, text.Put(), &status), S_OK);  // a negative status is a result
     EXPECT_EQ(std::to_string(code) + " " + Text(text.Get()) + " " + std::to_string(status), "-113 Undefined header -5");
-    EXPECT_EQ(second->Error_Query(&code, text.Put(), &status), S_OK);
-    EXPECT_EQ(Count("error_query"), 2);
     EXPECT_EQ(Count("init"), 1);
 
     EXPECT_EQ(first->Error_Message(-7, text.Put(), &status), S_OK);
     EXPECT_EQ(Text(text.Get()), "Seven");
-    EXPECT_EQ(first->Error_Message(-8, text.Put(), &status), S_OK);
-    EXPECT_EQ(Text(text.Get()), "Unknown status code 0xFFFFFFF8");
-    EXPECT_EQ(status, 0x3FFF0085);
     short result = 0;
     EXPECT_EQ(first->Self_Test(&result, text.Put(), &status), S_OK);
     EXPECT_EQ(std::to_string(result) + " " + Text(text.Get()), "-3 Input relay stuck");
     EXPECT_EQ(static_cast<unsigned long>(status), 0xBFFC0800);
-    EXPECT_EQ(first->Revision_Query(text.Put(), firmware.Put(), &status), S_OK);
-    EXPECT_EQ(Text(text.Get()) + "/" + Text(firmware.Get()), "drv 1.2/fw 7");
-    EXPECT_EQ(first->Reset(&status), S_OK);
-    EXPECT_EQ(status, 0x3FFC0101);
 }
 
 TEST_F(VxipnpSession, ResetOnAClosedSessionInitializesAndTheObjectKeepsTheSession) {
@@ -200,14 +161,6 @@ TEST_F(VxipnpSession, ResetOnAClosedSessionInitializesAndTheObjectKeepsTheSessio
     EXPECT_EQ(Count("close"), 1);
     vpp.Reset();  // the last reference to the session goes with it
     EXPECT_EQ(Count("close"), 2);
-}
-
-TEST_F(VxipnpSession, MissingStandardFunctionIsNamedAndNothingIsBound) {
-    auto session = GetSession(manager.Get(), L"VXIPNP::NoVpp");
-    ComPtr<IVPPBase> vpp;
-    ExpectError(session->GetVPPBaseInterface(vpp.Put()), 0xFFFFBD93,
-                "Could not find function 'simnovpp_reset' in DLL (or external module) '" + bin + "\\simnovpp_64.dll'.");
-    EXPECT_FALSE(vpp);
 }
 
 }  // namespace
