@@ -70,7 +70,7 @@ sm_install_sim_vxipnp() {
   local dir="$WINEPREFIX/drive_c/VXIPNP"
   mkdir -p "$dir/Win64/Bin"
   local prefix
-  for prefix in simdmm simscope simnoclose simnovpp; do
+  for prefix in simdmm simscope simnoclose; do
     [ -f "$SM_WINDOWS_BUILD/sim/vxipnp/${prefix}_64.dll" ] &&
       cp "$SM_WINDOWS_BUILD/sim/vxipnp/${prefix}_64.dll" "$dir/Win64/Bin/"
   done
