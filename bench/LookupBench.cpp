@@ -9,6 +9,9 @@
 //       file; the switch stand-in costs about 10 ms per device, so more would make a run take
 //       minutes) / building the same SAFEARRAY from a vector
 //
+//   P7.a-c  the floor under P7: the outside libraries' own calls that one GetNames("") makes,
+//       made directly (bench/ListingFloor.h), against GetNames("") and against the reference
+//
 // Prints ROW lines (bench/BenchReport.h) and a few notes.
 #include <windows.h>
 #include <psapi.h>
@@ -24,6 +27,7 @@
 #include <vector>
 
 #include "BenchReport.h"
+#include "ListingFloor.h"
 #include "com/ComPtr.h"
 #include "com/Interfaces.h"
 #include "com/UniqueHandles.h"
@@ -256,6 +260,89 @@ void MemoryPerSession(IInstrSessionMgr* manager) {
     bench::Row("M1", figure, value, "the goal", "2048 B", perSession / 2048.0, "<= 1.0");
 }
 
+std::string Milli(double seconds) {
+    char text[32];
+    std::snprintf(text, sizeof text, "%.2f ms", seconds * 1e3);
+    return text;
+}
+
+double BestOf(const std::function<void()>& call, int rounds) {
+    double best = 1e30;
+    for (int round = 0; round < rounds; ++round) best = std::min(best, BestBatch(call, 1));
+    return best;
+}
+
+// What one GetNames("") costs in the outside libraries: the calls it makes are counted in the
+// stand-ins around one listing, then made directly as often as it made them, in batches that
+// alternate with GetNames("") itself. Every group is also timed once per occurrence, so a group the
+// listing skipped (a cached resource list, an unchanged IVI store) still shows what it costs when
+// it is made. The VXIplug&play names come from the configuration file, without an outside library.
+void ListingFloor(IInstrSessionMgr* manager, const std::function<void()>& listing, double reference) {
+    bench::SimCounters visaCounts("visa32.dll"), iviCounts("iviconfig.dll"), engineCounts("rqengine.dll"),
+        switchLibraryCounts("qvrq.dll");
+    for (const auto* counters : {&visaCounts, &iviCounts, &engineCounts, &switchLibraryCounts}) counters->Reset();
+    listing();
+    long visaScans = visaCounts.Get("viFindRsrc"), visaParses = visaCounts.Get("viParseRsrc");
+    long iviOpens = iviCounts.Get("IviIni_OpenIniFile"), iviChanges = iviCounts.Get("IviIni_ConfigurationChanged"),
+         iviReloads = iviCounts.Get("IviIni_ReloadConfiguration"), iviReads = iviCounts.Get("IviIni_GetNumberOfVIs");
+    long engineListings = engineCounts.Get("EngineCreated");
+    long switchLibraryListings = switchLibraryCounts.Get("CssSSDeviceData_Create__");
+    std::printf("NOTE|P7 calls of one GetNames(\"\") (stand-ins' counters): VISA scans %ld (viFindNext %ld, "
+                "viParseRsrc %ld); IVI store opens %ld, change queries %ld, reloads %ld, reads %ld; switch engine "
+                "listings %ld, switch library listings %ld\n",
+                visaScans, visaCounts.Get("viFindNext"), visaParses, iviOpens, iviChanges, iviReloads, iviReads,
+                engineListings, switchLibraryListings);
+    for (const auto& [counters, name] : {std::pair{&visaCounts, "visa32.dll"}, std::pair{&iviCounts, "iviconfig.dll"},
+                                         std::pair{&engineCounts, "rqengine.dll"}})
+        if (!counters->Loaded()) std::printf("NOTE|P7 %s was not loaded: its counts read 0\n", name);
+    // A listing after the resource list was declared stale scans the VISA resources again.
+    double rescanned = 1e30;
+    for (int round = 0; round < 3; ++round) {
+        Check(manager->InvalidateVisaResourceList(), "InvalidateVisaResourceList");
+        visaCounts.Reset();
+        rescanned = std::min(rescanned, BestBatch(listing, 1));
+    }
+    std::printf("NOTE|P7 GetNames(\"\") after InvalidateVisaResourceList: %s, with %ld VISA scan(s) and %ld viFindNext\n",
+                Milli(rescanned).c_str(), visaCounts.Get("viFindRsrc"), visaCounts.Get("viFindNext"));
+
+    bench::VisaScan visa;
+    bench::IviStore ivi;
+    if (!visa.Usable() || !ivi.Usable() || bench::SwitchEngineListing() < 0) {
+        bench::NotMeasured("P7.a", "floor: the libraries' own calls of one GetNames(\"\")", "GetNames(\"\")",
+                           "a library or the switch engine is not installed in this prefix", "-");
+        return;
+    }
+    std::uint32_t resources = visa();
+    std::int32_t instruments = ivi.Read();
+    long devices = bench::SwitchEngineListing();
+    std::printf("NOTE|P7 each group once, best of 5: VISA scan of %u resources %s; IVI change query %s, reload %s, "
+                "read of %d instruments %s; switch engine listing of %ld devices %s\n",
+                resources, Milli(BestOf([&] { visa(); }, 5)).c_str(), Milli(BestOf([&] { ivi.Changed(); }, 5)).c_str(),
+                Milli(BestOf([&] { ivi.Reload(); }, 5)).c_str(), instruments,
+                Milli(BestOf([&] { ivi.Read(); }, 5)).c_str(), devices,
+                Milli(BestOf([] { bench::SwitchEngineListing(); }, 5)).c_str());
+    if (iviOpens || visaParses || switchLibraryListings)
+        std::printf("NOTE|P7 floor leaves out %ld IVI store open(s), %ld viParseRsrc call(s) and %ld switch library "
+                    "listing(s) the listing made\n", iviOpens, visaParses, switchLibraryListings);
+
+    auto libraries = [&] {
+        for (long index = 0; index < visaScans; ++index) visa();
+        for (long index = 0; index < iviChanges; ++index) ivi.Changed();
+        for (long index = 0; index < iviReloads; ++index) ivi.Reload();
+        for (long index = 0; index < iviReads; ++index) ivi.Read();
+        for (long index = 0; index < engineListings; ++index) bench::SwitchEngineListing();
+    };
+    Pair floor = Interleaved(listing, libraries, 3, 15);
+    double own = floor.figure - floor.reference;
+    bench::Row("P7.a", "floor: the libraries' own calls of one GetNames(\"\")", Milli(floor.reference).c_str(),
+               "GetNames(\"\") itself", Milli(floor.figure).c_str(), floor.reference / floor.figure, "-");
+    bench::Row("P7.b", "floor: the same calls", Milli(floor.reference).c_str(),
+               "the same SAFEARRAY of BSTRs built from a vector", Milli(reference).c_str(), floor.reference / reference,
+               "-");
+    bench::Row("P7.c", "GetNames(\"\") minus the floor: the manager's own work", Milli(own).c_str(),
+               "the same SAFEARRAY of BSTRs built from a vector", Milli(reference).c_str(), own / reference, "-");
+}
+
 void ListNames(IInstrSessionMgr* manager) {
     auto all = Bstr(L"");
     auto noFilter = Bstr(L"");
@@ -317,6 +404,7 @@ void ListNames(IInstrSessionMgr* manager) {
     const char* kind = "";
     double perName = names.empty() ? 0.0 : PerItem(before, after, names.size(), kind);
     std::printf("NOTE|P7 memory: %s per listed name while one result is held: %.0f B\n", kind, perName);
+    ListingFloor(manager, listing, p7.reference);
 }
 
 }  // namespace
