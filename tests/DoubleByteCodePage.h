@@ -1,6 +1,5 @@
-// The process code page for the length of a scope, restored however the scope ends (a failed
-// ASSERT included), and a fixture that runs its body under the double-byte code page 932
-// (Shift-JIS): character rules must hold for lead and trail bytes too.
+// The process code page for a scope, restored however it ends (a failed ASSERT too), and a fixture
+// that runs its body under the double-byte code page 932 (Shift-JIS).
 #pragma once
 
 #include <gtest/gtest.h>

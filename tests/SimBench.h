@@ -1,6 +1,5 @@
-// Drives the stand-ins of sim/ from a test: a setup file and a configuration directory of the test's
-// own, the call counters of the stand-in instance the product loaded into this process, and the
-// switch product taken away and put back.
+// Drives the stand-ins of sim/: a setup file and configuration directory of the test's own, the call
+// counters of the loaded stand-in, and the switch product taken away and put back.
 #pragma once
 
 #include <gtest/gtest.h>

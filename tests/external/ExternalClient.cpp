@@ -1,6 +1,5 @@
-// A client process of the shared external process, driven by its command line: each argument is
-// one step (get=*CUSTOM::Station, attach=Id:5, lock=unique:10, wait=Event, ...) and prints one line
-// that the test reads from the process's output file.
+// A client of the external process: each argument is one step (get=*CUSTOM::Station, lock=unique:10,
+// wait=Event, ...) that prints one line for the test to read.
 #include <windows.h>
 
 #include <cstdio>

@@ -1,5 +1,5 @@
-// Client processes sharing sessions through the external-process server: real client processes
-// (ExternalClient.exe), coordinated with named events, each printing what it saw. Every test ends by waiting, with a bound, for the server to leave after its last client.
+// Client processes (ExternalClient.exe) sharing sessions through the external-process server,
+// coordinated with named events; every test ends by waiting for the server to leave.
 #include <windows.h>
 
 #include <fstream>
@@ -67,8 +67,7 @@ private:
 
 Process Client(const std::string& name, const std::string& steps) { return Process(name, WindowsPath(CLIENT_EXE) + steps); }
 
-// Two processes share an item, the lock and one server. (The late-bound way into the server is the
-// refused class of the forwarding test; the one script client is tests/scripts/SessionClient.vbs.)
+// Two processes share an item, the lock and one server.
 TEST(SharedSession, ProcessesShareDataLockAndOneServer) {
     auto events = Events({"Held", "Waiting", "Done"});
     // The second asks for the server at the moment the first starts it: still one server.

@@ -1,6 +1,5 @@
 // IVI without its configuration library, with a store that cannot be opened, and with an older library
-// lacking the class-count functions. The library is loaded once per process and kept, so the cases run
-// in this order. Hiding renames the installed library; ctest holds the COM tests' lock meanwhile.
+// lacking the class-count functions; the library is loaded once per process, so the cases run in order.
 #include "SimBench.h"
 #include "com/ComClient.h"
 

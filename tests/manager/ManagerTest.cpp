@@ -116,38 +116,45 @@ TEST_F(Manager, ConcurrentRequestsForOneNameShareOneSession) {
 }
 
 namespace {
-UniqueKernelHandle NewEvent() { return UniqueKernelHandle(::CreateEventW(nullptr, TRUE, FALSE, nullptr)); }
+// The close action, inside the session's lock, waits up to 1 s for the other call: a call that does
+// not wait for the session's lock ends meanwhile.
+const UniqueKernelHandle insideClose(::CreateEventW(nullptr, TRUE, FALSE, nullptr));
+const UniqueKernelHandle otherCallDone(::CreateEventW(nullptr, TRUE, FALSE, nullptr));
 
-// Joins both threads; a deadlock ends the whole program as a failure instead of hanging it.
-void JoinOrFail(std::thread& first, std::thread& second) {
-    UniqueKernelHandle joined = NewEvent();
+// Closes the session beside the other call; a deadlock ends the program as a failure.
+template <class OtherCall>
+HRESULT CloseBesides(IInstrSession* closing, OtherCall otherCall) {
+    ::ResetEvent(insideClose.Get());
+    ::ResetEvent(otherCallDone.Get());
+    HRESULT closed = E_FAIL;
+    std::thread closer([&] { closed = closing->Close(); });
+    std::thread other([&] {
+        ::WaitForSingleObject(insideClose.Get(), INFINITE);
+        otherCall();
+        ::SetEvent(otherCallDone.Get());
+    });
+    const UniqueKernelHandle joined(::CreateEventW(nullptr, TRUE, FALSE, nullptr));
     std::thread watchdog([&] {
         if (::WaitForSingleObject(joined.Get(), 30000) == WAIT_OBJECT_0) return;
         std::fprintf(stderr, "deadlock: the threads did not finish within 30 s\n");
         std::fflush(stderr);
         std::_Exit(3);
     });
-    first.join();
-    second.join();
+    closer.join();
+    other.join();
     ::SetEvent(joined.Get());
     watchdog.join();
+    return closed;
 }
-
-// ---- a close function that renames its session while holding its lock ----------------------------
-HANDLE renamedInside = nullptr;
-HANDLE lookupDone = nullptr;
 
 void __stdcall RenameForAMoment(IInstrSession* closing) {
     closing->put_Name(Bstr(L"HalfwayName").Get());
-    ::SetEvent(renamedInside);
-    ::WaitForSingleObject(lookupDone, 1000);  // without the session's lock the lookup ends meanwhile
+    ::SetEvent(insideClose.Get());
+    ::WaitForSingleObject(otherCallDone.Get(), 1000);
     closing->put_Name(Bstr(L"LockedRename").Get());
 }
 
-// ---- an object whose release, from Close, drops the last reference of another session -----------
-HANDLE releaseEntered = nullptr;
-HANDLE listingDone = nullptr;
-
+// An object whose release, from Close, drops the last reference of another session.
 class SessionHolder final : public IUnknown {
 public:
     explicit SessionHolder(ComPtr<IInstrSession> held) : held(std::move(held)) {}
@@ -159,9 +166,9 @@ public:
     STDMETHODIMP_(ULONG) Release() override {
         ULONG left = --references;
         if (left == 0) {
-            ::SetEvent(releaseEntered);
-            ::WaitForSingleObject(listingDone, 1000);  // under the session's lock the listing cannot end
-            held.Reset();                               // final release: takes the manager's lock
+            ::SetEvent(insideClose.Get());
+            ::WaitForSingleObject(otherCallDone.Get(), 1000);
+            held.Reset();  // final release: takes the manager's lock
             delete this;
         }
         return left;
@@ -179,55 +186,34 @@ TEST(ManagerLockOrder, NameSearchWaitsForTheSessionsLock) {
     ComPtr<IInstrSessionMgr> manager = CreateManager();
     ComPtr<IInstrSession> session = GetSession(manager.Get(), L"CUSTOM::LockedRename");
     ASSERT_TRUE(session);
-    UniqueKernelHandle inside = NewEvent(), done = NewEvent();
-    renamedInside = inside.Get();
-    lookupDone = done.Get();
     UniqueVariant closeFunction;
     closeFunction->vt = VT_UI8;
     closeFunction->ullVal = reinterpret_cast<std::uintptr_t>(&RenameForAMoment);
     ASSERT_EQ(session->put_CloseFunctionEx(*closeFunction.Get()), S_OK);
-
-    HRESULT closed = E_FAIL, looked = E_FAIL;
+    HRESULT looked = E_FAIL;
     ComPtr<IInstrSession> found;
-    std::thread closer([&] { closed = session->Close(); });
-    std::thread searcher([&] {
-        ::WaitForSingleObject(renamedInside, INFINITE);
+    EXPECT_EQ(CloseBesides(session.Get(), [&] {
         looked = manager->GetInstrSession(Bstr(L"CUSTOM::HalfwayName").Get(), VARIANT_FALSE, found.Put());
-        ::SetEvent(lookupDone);
-    });
-    JoinOrFail(closer, searcher);
-    EXPECT_EQ(closed, S_OK);
+    }), S_OK);
     ASSERT_EQ(looked, S_OK);
     EXPECT_NE(IdentityOf(found.Get()), IdentityOf(session.Get()));
     EXPECT_EQ(NameOf(session.Get()), "LockedRename");
 }
 
-// Fault: Close released its release-on-close objects under the session's lock; one that dropped
-// the last reference of another session took the manager's lock there, while the state text
-// holds the manager's lock and waits for this session's: the two threads deadlocked.
+// Fault: Close released its objects under the session's lock; one that dropped another session took
+// the manager's lock there, while the state text held the manager's and waited for the session's.
 TEST(ManagerLockOrder, CloseReleasesObjectsAfterLeavingTheSessionsLock) {
     ComPtr<IInstrSessionMgr> manager = CreateManager();
     ComPtr<IInstrSession> closing = GetSession(manager.Get(), L"CUSTOM::ClosesWithHolder");
     ASSERT_TRUE(closing);
-    UniqueKernelHandle entered = NewEvent(), listed = NewEvent();
-    releaseEntered = entered.Get();
-    listingDone = listed.Get();
     {
         auto* holder = new SessionHolder(GetSession(manager.Get(), L"CUSTOM::ReleasedByHolder"));
         ASSERT_EQ(closing->AttachObject(Bstr(L"holder").Get(), holder, Bstr(L"").Get(), VARIANT_TRUE), S_OK);
         holder->Release();  // the session holds the only reference now
     }
-
-    HRESULT closed = E_FAIL, described = E_FAIL;
+    HRESULT described = E_FAIL;
     UniqueBstr state;
-    std::thread closer([&] { closed = closing->Close(); });
-    std::thread lister([&] {
-        ::WaitForSingleObject(releaseEntered, INFINITE);
-        described = manager->get_StateDescription(state.Put());
-        ::SetEvent(listingDone);
-    });
-    JoinOrFail(closer, lister);
-    EXPECT_EQ(closed, S_OK);
+    EXPECT_EQ(CloseBesides(closing.Get(), [&] { described = manager->get_StateDescription(state.Put()); }), S_OK);
     EXPECT_EQ(described, S_OK);
     EXPECT_NE(Text(state.Get()).find("Name: ClosesWithHolder"), std::string::npos);
 }

@@ -1,11 +1,5 @@
-// Hostile automation input through the vtables of the manager and of a session of every category:
-// null out-pointers and BSTRs, a 10 MB text, embedded NULs, text outside the code page, extreme
-// timeouts, flags and enumerations out of range, wrong VARIANT types. One check per decision; what a
-// lower layer's tests decide (conversion, lock and item rules, the listings' null checks) is not
-// repeated. Each check asserts the exact HRESULT and error text (none where the product sets none);
-// after every test the session table must be empty again.
-//
-// Every test runs once per entry of sessionNames: a new category adds one line there.
+// Hostile automation input through the vtables, with the exact HRESULT and error text of each answer;
+// after every test the session table must be empty again. Each test runs once per entry of sessionNames.
 #include <gtest/gtest.h>
 
 #include <cmath>
@@ -43,8 +37,7 @@ void ExpectLate(const LateResult& late, unsigned long code, const std::string& t
     EXPECT_EQ(std::make_tuple(late.result, late.code, late.description), std::make_tuple(DISP_E_EXCEPTION, code, text));
 }
 
-// The manager and a session of one category. Whatever a test made is let go at its end, and then the
-// table must be empty: no call may leave a half-made or leaked session behind.
+// Whatever a test made is let go at its end: a half-made or leaked session stays in the table.
 class BadInput : public ::testing::TestWithParam<const wchar_t*> {
 protected:
     void SetUp() override {
@@ -70,8 +63,7 @@ protected:
     ComPtr<IInstrSession> session, made;
 };
 
-// Each out-pointer with a check of its own; the session's shared members clear theirs through one
-// helper, so get_Name stands for them all.
+// The session's shared members clear their out-pointers through one helper: get_Name stands for them.
 TEST_P(BadInput, NullOutPointersAreRefusedAndCreateNothing) {
     ExpectAnswer(manager->GetInstrSession(Wide(L"CUSTOM::X").Get(), VARIANT_FALSE, nullptr), E_POINTER);
     ExpectAnswer(manager->get_InExternalProcess(nullptr), E_POINTER);
@@ -139,8 +131,7 @@ TEST_P(BadInput, EnumerationsOutOfRange) {
     EXPECT_FALSE(driver);
 }
 
-// A VARIANT argument arrives as the caller typed it, early- and late-bound; late-bound, a number for
-// a name is turned into its text before the method runs.
+// Late-bound, a number for a name is turned into its text before the method runs.
 TEST_P(BadInput, WrongVariantTypes) {
     VARIANT number;
     ::VariantInit(&number);

@@ -1,10 +1,5 @@
-// Stress through the registered DLL: worker threads get and release the same names, make and rename
-// new sessions, attach and detach items, lock and unlock with shared keys and short timeouts, and list
-// and describe while sessions come and go. A worker still running stall-seconds after the stop is
-// taken for a deadlock (exit 3, with what it was doing; "demo-deadlock" shows it: the main thread
-// keeps the first name's lock that worker 0 waits for). Exit 0: no failed call and, at the end, every
-// lock free, only the pinned sessions live and none once those are released.
-//
+// Worker threads mix every manager and session call over shared names (docs/reliability.md). A worker
+// still running stall-seconds after the stop is a deadlock (exit 3; "demo-deadlock" makes one).
 //     SessionStress [seconds=10] [threads=8] [stall-seconds=120] [demo-deadlock]
 #include <objbase.h>
 #include <windows.h>
@@ -26,8 +21,7 @@ using namespace sm;
 
 namespace {
 
-// The names the workers share: every category, on the demo bench (sim/simsetup.ini through
-// SM_SIM_SETUP, the VXIplug&play directory C:\VXIPNP through VXIPNPPATH; ctest sets both).
+// Every category on the demo bench (ctest sets SM_SIM_SETUP and VXIPNPPATH).
 const std::vector<const wchar_t*> names = {L"CUSTOM::Bench", L"custom/Dmm", L"VISA::GPIB0::14::INSTR", L"VXIPNP::DMM1",
                                            L"IVI::MyDmm", L"RQ::DmmToDut"};
 
@@ -108,8 +102,7 @@ private:
         }
     }
 
-    // Opens the driver session (a custom session has none: E_NOTIMPL) or closes it while other
-    // workers use the same session.
+    // Opens the driver session (a custom session has none) or closes it while others use it.
     void OpenOrCloseDriver() {
         IInstrSession* session = AnySession();
         if (!session || Pick(3) == 0) return void(session && Check(session->Close(), "Close"));
@@ -128,9 +121,8 @@ private:
         Check(session->DetachData(Bstr(id).Get()), "DetachData");
     }
 
-    // Shared keys (two spellings of one) contend; a unique key from the manager never matches another.
-    // A taken lock is kept over later operations and let go by a later call, so other workers meet
-    // it held and wait or time out.
+    // Shared keys (two spellings of one) contend; a taken lock is kept over later operations, so other
+    // workers meet it held and wait or time out.
     void LockOrUnlock() {
         if (!locks.empty() && (locks.size() >= 3 || Pick(2) == 0)) {
             std::size_t index = Pick(locks.size());

@@ -1,5 +1,4 @@
-// Switch names and sessions against the installed switch stand-ins: names from the engine, from the
-// library when the engine is not installed, and from neither; sessions opened and closed through
+// Switch names from the engine, from the library alone and from neither, and sessions through
 // "qvrq.dll". Each suite is one installation state; ctest runs each in a process of its own.
 #include <memory>
 

@@ -1,6 +1,5 @@
-// Late-bound calls from a single-threaded apartment, as a script host makes them, for what Wine's
-// script engines cannot read: SAFEARRAY(BSTR) and SAFEARRAY(IDispatch) results, and [out] parameters
-// that are not the return value. One test per kind of member; the decisions are tested early-bound.
+// Late-bound calls as a script host makes them, for what Wine's script engines cannot read: array
+// results and [out] parameters. One test per kind of member.
 #include <gtest/gtest.h>
 
 #include <string>

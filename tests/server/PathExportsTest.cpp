@@ -1,6 +1,4 @@
-// The plain exports as the product's other programs use them: the DLL loaded with LoadLibraryA and
-// each function found by name. The registry values and files they read are set up here with the
-// real registry and file APIs, in the test prefix, and removed again.
+// The plain exports as the product's other programs use them: loaded with LoadLibraryA, found by name.
 #include <gtest/gtest.h>
 
 #include <windows.h>
@@ -93,9 +91,8 @@ const std::string beacon = "DEV BUILD BEACON (Do not delete or install).txt";
 
 }  // namespace
 
-// Which values count is the directory rules' own decision (DirectoryGetterTest); here the real
-// registry's two views, an expandable value, a missing key and the shell folders. A crashed earlier
-// run may have left the engine registered: an installed layout needs it gone.
+// The rules are DirectoryGetterTest's; here the registry's two views, an expandable value, a missing
+// key and the shell folders. A crashed earlier run may have left the engine registered.
 TEST(InstalledLayout, DirectoriesFromTheRegistryInItsViewOrTheShellFolders) {
     EngineRegistration::Remove();
     std::string version = UniqueVersion("Installed");
@@ -136,8 +133,7 @@ TEST(DevelopmentLayout, ALoadedFrameworkModuleLocatesTheInstallation) {
     EXPECT_EQ(Directory("GetVerentisCommonAppDataDirectory", UniqueVersion("Framework")), scratch.path + "\\Work\\CommonAppData\\");
 }
 
-// The path rules themselves are the framework's (PathTest); here their way through the exports and
-// that no failure crosses an export: a missing file or a null argument is false, a null out-pointer no crash.
+// The rules are PathTest's; here that no failure crosses an export (false, or no crash).
 TEST(PathChecks, ReachTheFrameworkAndNeverRaiseAcrossTheExport) {
     auto isValidPath = Export<bool(const char*, int)>("IsValidPath");
     auto filesAreIdentical = Export<bool(const char*, const char*)>("FilesAreIdentical");

@@ -1,8 +1,5 @@
-// What DllRegisterServer and DllUnregisterServer leave in the registry, and the module lock a held
-// class object takes. The keys of every served class (ProgIDs and class keys) are data: they are
-// dumped, one line per key and value, and compared with registration.expected (a differing dump is
-// left in registration.actual in the build folder). The DLL is loaded by path and its exports are
-// called directly; every test leaves the DLL registered for the tests after it.
+// What registration leaves in the registry: the served classes' keys are dumped and compared with
+// registration.expected (a differing dump goes to registration.actual). Every test leaves the DLL registered.
 #include <gtest/gtest.h>
 
 #include <fstream>
@@ -38,8 +35,7 @@ std::optional<std::string> ReadString(const std::string& path, const char* value
     return std::string(buffer);
 }
 
-// A key with its values ("path: name = value", the default value's name empty) and its subkeys,
-// each level sorted; the module path reads as <module>. A missing key dumps as nothing.
+// A key's values ("path: name = value") and subkeys, sorted; the module path reads as <module>.
 std::string Dump(const std::string& path, const std::string& modulePath) {
     UniqueRegistryKey key;
     if (::RegOpenKeyExA(HKEY_CLASSES_ROOT, path.c_str(), 0, KEY_READ, key.Put()) != ERROR_SUCCESS) return "";
@@ -124,8 +120,7 @@ TEST_F(Registration, WritesEveryKeyOfTheTableAndReplacesClassKeysWhole) {
     ExpectTheClassKeys();
     // VISA sessions are made by the manager only: no keys of their own.
     EXPECT_FALSE(KeyExists("CLSID\\{A61E03D4-58B2-4C9F-8E07-3B9D12F6A5C8}"));
-    // The type library is registered (what the system files under Interface is the system's; that the
-    // interfaces marshal through it is ListingTest's cross-apartment test).
+    // That the interfaces marshal through it is ListingTest's cross-apartment test.
     EXPECT_EQ(::LoadRegTypeLib(LIBID_SM, 1, 0, 0x409, ComPtr<ITypeLib>().Put()), S_OK);
     // Also filed under the neutral locale, where Wine's marshaler looks for it, naming the same file.
     const std::string versionKey = std::string("TypeLib\\") + libraryId + "\\1.0";

@@ -1,5 +1,4 @@
-// The COM frame as clients meet it: class objects, the singleton manager, aggregation, unloading
-// and the error info support.
+// The COM frame as clients meet it: class objects, the singleton, aggregation, unloading, error info.
 #include <gtest/gtest.h>
 
 #include "com/ComClient.h"
@@ -47,8 +46,7 @@ TEST(ClassObjects, SessionClassesAggregateOnlyAskedForIUnknownAndWorkWithoutAMan
     EXPECT_EQ(::CoCreateInstance(CLSID_CustomInstrSession, &outer, CLSCTX_INPROC_SERVER, IID_IInstrSession, session.PutVoid()),
               CLASS_E_NOAGGREGATION);
     ASSERT_EQ(::CoCreateInstance(CLSID_CustomInstrSession, &outer, CLSCTX_INPROC_SERVER, IID_IUnknown, outer.inner.PutVoid()), S_OK);
-    // Through the outer object the inner interface answers, and its IUnknown is the outer one; a
-    // session made without a manager works.
+    // The inner interface answers through the outer object, whose IUnknown is its identity.
     ASSERT_EQ(outer.QueryInterface(IID_IInstrSession, session.PutVoid()), S_OK);
     EXPECT_EQ(session->AttachLong(Bstr(L"A").Get(), 5), S_OK);
     ComPtr<IUnknown> identity;
@@ -72,8 +70,7 @@ TEST(Unloading, OnlyTheFactoryHoldingTheManagerLetsTheDllGo) {
     EXPECT_EQ(CallDllCanUnloadNow(), S_OK);
 }
 
-// The error itself, early- and late-bound, is checked by the manager, session and bad-input tests;
-// here what a client asks before it reads error info.
+// What a client asks before it reads error info.
 TEST(ErrorInfo, OnlyTheManagersOwnInterfaceSupportsIt) {
     ComPtr<ISupportErrorInfo> supports;
     ASSERT_EQ(CreateManager()->QueryInterface(IID_ISupportErrorInfo, supports.PutVoid()), S_OK);
