@@ -104,7 +104,6 @@ struct Client {
             std::printf("server pid=%ld clients=%ld\n", number, count);
         } else if (verb == "foreign") {
             // A class that is not ours, late-bound (DISPID 7): Wine carries the server's error text only in EXCEPINFO.
-            auto server = Server();
             auto foreign = Bstr("{00020424-0000-0000-C000-000000000046}"), iid = Bstr("{00000000-0000-0000-C000-000000000046}");
             VARIANT arguments[2] = {};  // last argument first
             arguments[0].vt = arguments[1].vt = VT_BSTR;
@@ -112,10 +111,9 @@ struct Client {
             arguments[1].bstrVal = foreign.Get();
             DISPPARAMS parameters = {arguments, nullptr, 2, 0};
             UniqueVariant result;
-            EXCEPINFO exception = {};
-            HRESULT late = server->Invoke(7, IID_NULL, 0, DISPATCH_METHOD, &parameters, result.Get(), &exception, nullptr);
-            UniqueBstr description(exception.bstrDescription), source(exception.bstrSource), help(exception.bstrHelpFile);
-            std::printf("foreign dispatch hr=0x%08lx scode=0x%08lx desc=%s\n", late, exception.scode, Text(description.Get()).c_str());
+            UniqueExcepInfo exception;
+            HRESULT late = Server()->Invoke(7, IID_NULL, 0, DISPATCH_METHOD, &parameters, result.Get(), &exception, nullptr);
+            std::printf("foreign dispatch hr=0x%08lx scode=0x%08lx desc=%s\n", late, exception.scode, Text(exception.bstrDescription).c_str());
         } else if (verb == "signal") {
             ::SetEvent(Event(argument));
         } else if (verb == "wait") {
