@@ -1,5 +1,5 @@
-// libFuzzer target for INI text: read any bytes, write the document, read the text back; the rule is
-// in IniRoundTrip.h, which the INI tests share.
+// libFuzzer target for INI text: read any bytes, write the document, read the text back, and carry
+// the text as an escaped value; the rule is in IniRoundTrip.h.
 #include "FuzzCheck.h"
 #include "IniRoundTrip.h"
 
