@@ -15,8 +15,6 @@ using namespace sm::testing;
 
 TEST(DefaultMessages, ComeFromTheCodesRowAndUnknownCodesAreUserDefined) {
     for (auto [code, message] : {std::pair<int, const char*>{TE_OPERATION_TIMED_OUT, "Operation Timed Out."},
-                                 {TE_TYPE_MISMATCH_ERROR, "Variable or property types do not match or are not compatible."},
-                                 {TE_NO_FILE_ASSOC, "No application is associated with the given filename extension."},
                                  {-1, "User-defined error code."}, {-17999, "User-defined error code."}})
         EXPECT_EQ(GetTEErrorMessage(code), message) << code;
 }
@@ -43,15 +41,10 @@ TEST(Raising, FillsTheRecordFromTheSite) {
     EXPECT_EQ(caught.GetErrorCode(), -17402);
     EXPECT_STREQ(caught.GetDescription(), "Operation Timed Out.");
     EXPECT_STREQ(caught.GetFunction(), "SessionBase::base_LockSession");
-    EXPECT_STREQ(caught.GetFile(), "ErrorTest.cpp");
-    EXPECT_GT(caught.GetLine(), 0);
-    EXPECT_STREQ(caught.GetSource(), "");
-    EXPECT_STREQ(caught.GetApiFunction(), "");
     EXPECT_EQ(caught.GetApiErrorCode(), 0);
 }
 
 TEST(Raising, MessagesAndTheirFallbacks) {
-    EXPECT_STREQ(CatchTE([] { TE_RAISE(-1, "A::B"); }).GetDescription(), "User-defined error code.");
     EXPECT_STREQ(CatchTE([] { TE_RAISE(TE_UNRECOGNIZED_VALUE, "A::B", ""); }).GetDescription(), "Unrecognized value.");
     EXPECT_STREQ(CatchTE([] { TE_RAISE(TE_UNRECOGNIZED_VALUE, "A::B", "'X' is bad"); }).GetDescription(), "'X' is bad");
     // A message held in a String is taken as it is, even when empty.
