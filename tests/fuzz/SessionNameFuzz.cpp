@@ -1,6 +1,5 @@
-// libFuzzer target for the name syntax: the category separator (where, how long, inside the text)
-// and the external-process prefixes (recognised, stripped exactly, added then stripped gives the text
-// back). The first input byte picks the code page (bit 0: double-byte 932); the rest is the name.
+// libFuzzer target for the name syntax: the category separator and the external-process prefixes.
+// Input: mode byte (bit 0: code page 932), then the name.
 #include <cstddef>
 #include <cstdint>
 #include <string>
