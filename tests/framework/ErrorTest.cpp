@@ -6,7 +6,6 @@
 #include <sstream>
 #include <string>
 
-#include "framework/DebugOutput.h"
 #include "framework/LanguageStrings.h"
 #include "framework/TEException.h"
 
@@ -30,7 +29,6 @@ TEST(DefaultMessages, EveryTableRowHasItsOwnMessage) {
 
 TEST(LanguageTable, LookupsIgnoreCaseAndMissingKeysGiveTheDefaultOrTheNotFoundText) {
     EXPECT_EQ(GetLanguageString("te_errors", "te_operation_failed"), "Operation Failed.");
-    EXPECT_EQ(GetLanguageString("Err_Descr", "cant_find_file"), "Could not find file '%1'.");
     EXPECT_EQ(GetLanguageString("TE_ERRORS", "NO_SUCH_KEY", "my default"), "my default");
     EXPECT_EQ(GetLanguageString("TE_ERRORS", "NO_SUCH_KEY"), "String not found in the language resource files");
     EXPECT_EQ(GetLanguageString("NO_SECTION", "TE_OPERATION_FAILED"), "String not found in the language resource files");
@@ -83,29 +81,6 @@ TEST(Diagnostics, WriteDescriptionLines) {
     CatchTE([] { TE_RAISE(TE_PROGRAM_ERROR, "A::B"); }).WriteDescription("here", plain);
     EXPECT_EQ(plain.str().find("API Function"), std::string::npos);
     EXPECT_EQ(plain.str().find("Source:"), std::string::npos);
-}
-
-TEST(Diagnostics, RaiseCanWriteToTheDebugOutputAtOnce) {
-    StartDebugOutputCapture();
-    CatchTE([] { TE_RAISE(TE_PROGRAM_ERROR, "A::B", RaiseDetails{.writeToDebugOutput = true}); });
-    std::string written = StopDebugOutputCapture();
-    EXPECT_NE(written.find("Program Error.\nError Code: -17001\n"), std::string::npos);
-    EXPECT_NE(written.find("Where caught:  Debugging When Exception Constructed\n"), std::string::npos);
-}
-
-TEST(Diagnostics, MissingArgumentWarningOnlyAboveLevelZero) {
-    auto warningOf = [](int level) {
-        SetDebugOutputLevel(level);
-        StartDebugOutputCapture();
-        DynamicString("x").ReplaceArg(1, "y");
-        SetDebugOutputLevel(0);
-        return StopDebugOutputCapture();
-    };
-    EXPECT_EQ(warningOf(0), "");
-    std::string written = warningOf(1);
-    EXPECT_EQ(written.rfind("WARNING! 'Could not find argument to replace in string' Line ", 0), 0u);
-    EXPECT_NE(written.find(" in function String::HandleMissingFormatArgument in file String.cpp\nCompilation Date: "),
-              std::string::npos);
 }
 
 TEST(SystemErrors, MapToFileCodes) {

@@ -1,5 +1,4 @@
-// INI documents: the line splitter, the reader's rules, the writer's rules (and its refusal to write
-// what would not read back), values and files.
+// INI documents: lines, the reader's and writer's rules (refusals too), values and files.
 #include <gtest/gtest.h>
 
 #include <chrono>
@@ -65,8 +64,6 @@ using IniDoubleByte = DoubleByteCodePage;
 const std::string f640(640, 'f');
 }  // namespace
 
-// ---- Lines ---------------------------------------------------------------------------------------
-
 TEST(IniLines, EndAtLfCrOrNulAndPairedEndsCountOnce) {
     EXPECT_EQ(Lines(std::string("a\nb\rc\r\nd\n\re\0f", 14)), (Texts{"a", "b", "c", "d", "e", "f"}));
     for (std::string text : {std::string("a\r\n\r\nb"), std::string("a\n\n\rb"), std::string("a\0\nb", 4),
@@ -96,8 +93,6 @@ TEST_F(IniDoubleByte, LineCutNeverSplitsADoubleByteCharacter) {
     EXPECT_EQ(Lines(std::string(639, 'a') + wideA + "tail\n"), Texts{std::string(639, 'a')});
     EXPECT_EQ(Lines(std::string(638, 'a') + wideA + "tail"), Texts{std::string(638, 'a') + wideA});
 }
-
-// ---- Reading -------------------------------------------------------------------------------------
 
 TEST(IniReading, DuplicateSectionsStayTwoAndLookupsFindTheFirstByCaseSensitiveName) {
     for (bool sorted : {false, true}) {
@@ -137,8 +132,6 @@ TEST(IniReading, LongLinesNumberedPiecesAndReplacement) {
     EXPECT_EQ(Describe(pieces), "[New]{b=2}");
 }
 
-// ---- Writing -------------------------------------------------------------------------------------
-
 TEST(IniWriting, SectionsItemsAndLineEnds) {
     IniObj ini;
     ini.Put("First", "x", "1", false);
@@ -149,7 +142,6 @@ TEST(IniWriting, SectionsItemsAndLineEnds) {
     DynamicString target("old text");
     ini.WriteString(target, true);
     EXPECT_EQ(target.View(), "[First]\nx = 1\npath = \"C:\\\\dir\"\n\n[Empty value]\ne = \nq = \"\"\n\n");
-    EXPECT_EQ(IniObj().WriteString(false), "");
 }
 
 TEST(IniWriting, PutReplacesEverySameNamedItemAtTheFirstOnesPlace) {
@@ -237,12 +229,8 @@ TEST(IniWriting, NamesThatWouldReadBackAsPiecesAreRefused) {
     EXPECT_EQ(Describe(Read(fine.WriteString(false))), "[S]{k Line0003=tail}{m Line0001=" + std::string(130, 'b') + "}");
 }
 
-// ---- Values --------------------------------------------------------------------------------------
-
 TEST(IniValues, EscapeTableBothWays) {
-    std::string raw = "a\tb\nc\rd\"e\\f\x01g\x7fh\x1f", escaped = "a\\tb\\nc\\rd\\\"e\\\\f\\x01g\\x7fh\\x1f";
-    EXPECT_EQ(EscapeIniText(raw), escaped);
-    EXPECT_EQ(UnescapeIniText(escaped), raw);
+    EXPECT_EQ(EscapeIniText("a\tb\nc\rd\"e\\f\x01g\x7fh\x1f"), "a\\tb\\nc\\rd\\\"e\\\\f\\x01g\\x7fh\\x1f");
     EXPECT_EQ(UnescapeIniText("\\x4A\\x4a|\\xZZ|\\x4|\\x00|\\q\\'|end\\"), "JJ|xZZ|x4|x00|q'|end");
 }
 
@@ -260,7 +248,6 @@ TEST(IniValues, TextGetDecodesRawGetDoesNotAndMissingLeavesTheOutputAlone) {
     ASSERT_TRUE(ini.GetRaw("S", "msg", raw));
     EXPECT_EQ(raw.View(), "say \\\"hi\\\"\\tnow\\x01");
     EXPECT_FALSE(ini.Get("S", "nothing", untouched));
-    EXPECT_FALSE(ini.Get("Nothing", "msg", untouched));
     EXPECT_EQ(untouched.View(), "keep");
 }
 
@@ -295,8 +282,6 @@ TEST(IniValues, PathsDecodeOnlyBackslashAndQuoteAndAreNeverCut) {
     EXPECT_EQ(path.View(), "C:\\Program Files\\fl45_64.dll");
 }
 
-// ---- Files ---------------------------------------------------------------------------------------
-
 // Catches a reader that opens for writing (the file is read-only), touches the file, or loses lines at blocks.
 TEST(IniFiles, ReadsLikeReadStringAcrossBlocksWithoutChangingTheFile) {
     namespace fs = std::filesystem;
@@ -311,7 +296,6 @@ TEST(IniFiles, ReadsLikeReadStringAcrossBlocksWithoutChangingTheFile) {
     fromFile.ReadFile(file);
     fs::permissions(file, fs::perms::owner_all);
     EXPECT_EQ(Describe(fromFile), Describe(Read(text)));
-    EXPECT_EQ(fromFile.GetFilePath().View(), file);
     EXPECT_EQ(ReadFileBytes(file), text);
     EXPECT_EQ(fs::last_write_time(file), old);
 }
