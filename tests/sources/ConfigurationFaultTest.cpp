@@ -1,5 +1,4 @@
-// The VXIplug&play directory from an empty registry value, and a configuration file that cannot be
-// written. The directory is resolved once per process: the tests run in declaration order.
+// An empty registry value and an unwritable configuration file; the tests run in declaration order.
 #include <gtest/gtest.h>
 #include <windows.h>
 

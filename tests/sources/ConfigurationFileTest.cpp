@@ -1,6 +1,4 @@
-// The configuration file on a real file system under Wine: regeneration from driver images,
-// re-reading by write time, and what the VXIplug&play source makes of it. The directory comes from
-// the VXIPNPPATH environment variable, resolved once per process.
+// The configuration file under Wine: regeneration, re-reading by write time; VXIPNPPATH is read once.
 #include <gtest/gtest.h>
 #include <windows.h>
 
@@ -126,43 +124,20 @@ TEST_F(ConfigurationFile, NewerWriteTimeIsReadAgainAndOlderIsNot) {
     EXPECT_EQ(CurrentGeneration(), before);
     SetWriteTime(file, 3600);
     EXPECT_EQ(CurrentGeneration(), before + 1);
-
-    VxipnpInfo source;
-    source.GetConfigurationLists();
-    ASSERT_EQ(source.VirtualInstruments().size(), 1u);
-    VxipnpVInstr found;
-    ASSERT_TRUE(source.FindVInstr("dmm1", found));
-    EXPECT_EQ(std::string(found.name.View()) + " " + std::string(found.resource.View()) + " " +
-                  std::string(found.modulePath.View()), "abc GPIB0::14::INSTR " + platform + "\\abc.dll");
-}
-
-TEST_F(ConfigurationFile, StateDescriptionShowsTheFileAndItsInstruments) {
+    // What was read again shows in the source's text; its head (file, directories) is checked by the
+    // listing and registry tests.
     VxipnpInfo source;
     DynamicString text;
     source.AppendStateDescription(text);
-    std::string described(text.View());
-    EXPECT_EQ(described.rfind("VXIPNP Configuration:\n   Session Manager configuration file: " + file +
-                                  ", Number of sections: 5\nVXIPNP directory: " + root +
-                                  "\nVXIPNP directory from registry: \nVXIPNP directory from PATH: " + root +
-                                  "\nVXIPNP platform directory: " + platform + "\n\nFile Contents:\n",
-                              0),
-              0u)
-        << described;
-    EXPECT_NE(described.find("   Number of virtual instruments = 1\n      Virtual Instrument # = 0\n"
-                             "         name list (2):abc (VirtualInstrumentName), DMM1 (LogicalName)\n"
-                             "         modulePath '" +
-                             platform + "\\abc.dll'\n         prefix 'abc'\n         resource 'GPIB0::14::INSTR'\n\n\n"),
-              std::string::npos)
-        << described;
+    EXPECT_NE(std::string(text.View()).find("   Number of virtual instruments = 1\n      Virtual Instrument # = 0\n"
+                                            "         name list (2):abc (VirtualInstrumentName), DMM1 (LogicalName)\n"
+                                            "         modulePath '" + platform + "\\abc.dll'\n         prefix 'abc'\n"
+                                            "         resource 'GPIB0::14::INSTR'\n\n\n"), std::string::npos) << text.GetText();
 }
 
-TEST(DriverImages, ExportNamesOfRealImages) {
+// Real images are read by the regeneration above.
+TEST(DriverImages, AMissingImageRaisesItsFileError) {
     StringVector names;
-    ReadDLLExports(SCAN_OTHERCASE, names);
-    std::string plain;
-    for (const auto& name : names) plain += std::string(name.View()) + " ";
-    EXPECT_EQ(plain, "ExportOnlyDriverEntry odd_ErrorMessage odd_ErrorQuery odd_RevisionQuery odd_SelfTest odd_close "
-                     "odd_init odd_reset ");
     TEException error = CatchTE([&] { ReadDLLExports(root + "\\no such file.dll", names); });
     EXPECT_EQ(error.GetErrorCode(), TE_FILE_NOT_FOUND);
     EXPECT_EQ(error.GetApiErrorCode(), 2);

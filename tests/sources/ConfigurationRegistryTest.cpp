@@ -1,5 +1,4 @@
-// The VXIplug&play directory from the registry: it wins over the environment, and the file is
-// regenerated in its platform folder.
+// The VXIplug&play directory from the registry wins over the environment and receives the file.
 #include <gtest/gtest.h>
 #include <windows.h>
 

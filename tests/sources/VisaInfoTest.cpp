@@ -1,6 +1,4 @@
-// The VISA source against the simulated VISA library installed as the system's visa32.dll: the
-// resource scan and its cache, logical names of the configuration file, names VISA only parses, and
-// how a failing scan is reported. The configuration directory comes from VXIPNPPATH (once per process).
+// The VISA source over the simulated visa32.dll: scan cache, logical names, parsed names, failed scans.
 #include <gtest/gtest.h>
 
 #include <filesystem>
