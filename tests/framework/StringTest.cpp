@@ -130,13 +130,3 @@ TEST(StringNumbers, FullSixtyFourBitValues) {
     text.AppendUnsigned(0x123456789ABCDEF0ull, "%x").Append("|").AppendDouble(0.1).Append("|").AppendDouble(1.0 / 3.0);
     EXPECT_STREQ(text.GetText(), "-9223372036854775808|18446744073709551615|123456789abcdef0|0.1|0.3333333333333");
 }
-
-TEST(BufferStringKind, WritesAreCutToTheCallersBuffer) {
-    char storage[8] = "";
-    BufferString view(storage, 7);
-    view.Assign("0123456789");
-    EXPECT_STREQ(storage, "0123456");
-    BufferString literal("fixed");
-    EXPECT_STREQ(literal.GetText(), "fixed");
-    EXPECT_THROW(literal.Append("x"), TEException);
-}

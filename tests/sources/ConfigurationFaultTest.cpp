@@ -4,6 +4,7 @@
 
 #include <string>
 
+#include "SimBench.h"
 #include "sources/ConfigurationFile.h"
 
 using namespace sm;
@@ -11,11 +12,7 @@ using namespace sm;
 namespace {
 constexpr const char* vxipnpKey = "SOFTWARE\\VXIPNP_Alliance\\VXIPNP\\CurrentVersion";
 
-const std::string root = [] {
-    char temp[MAX_PATH];
-    ::GetTempPathA(MAX_PATH, temp);
-    return std::string(temp) + "SessionMgrConfigurationFaultTest";
-}();
+const std::string root = sm::testing::TempPath("SessionMgrConfigurationFaultTest");
 const std::string platform = root + "\\Win64";
 
 // Virtual instruments in the configuration: one per driver found.

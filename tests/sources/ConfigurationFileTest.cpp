@@ -8,6 +8,7 @@
 #include <string>
 
 #include "CatchTE.h"
+#include "SimBench.h"
 #include "TempFolder.h"
 
 #include "framework/PeExports.h"
@@ -20,11 +21,8 @@ using namespace sm::testing;
 
 namespace {
 const std::string root = [] {
-    char temp[MAX_PATH];
-    ::GetTempPathA(MAX_PATH, temp);
-    std::string folder = std::string(temp) + "SessionMgrConfigurationTest";
-    ::SetEnvironmentVariableA("VXIPNPPATH", folder.c_str());
-    return folder;
+    ::SetEnvironmentVariableA("VXIPNPPATH", TempPath("SessionMgrConfigurationTest").c_str());
+    return TempPath("SessionMgrConfigurationTest");
 }();
 const std::string platform = root + "\\Win64";
 const std::string file = platform + "\\QVSessionMgr.ini";
@@ -127,12 +125,12 @@ TEST_F(ConfigurationFile, NewerWriteTimeIsReadAgainAndOlderIsNot) {
     // What was read again shows in the source's text; its head (file, directories) is checked by the
     // listing and registry tests.
     VxipnpInfo source;
-    DynamicString text;
-    source.AppendStateDescription(text);
-    EXPECT_NE(std::string(text.View()).find("   Number of virtual instruments = 1\n      Virtual Instrument # = 0\n"
+    DynamicString state;
+    source.AppendStateDescription(state);
+    EXPECT_NE(std::string(state.View()).find("   Number of virtual instruments = 1\n      Virtual Instrument # = 0\n"
                                             "         name list (2):abc (VirtualInstrumentName), DMM1 (LogicalName)\n"
                                             "         modulePath '" + platform + "\\abc.dll'\n         prefix 'abc'\n"
-                                            "         resource 'GPIB0::14::INSTR'\n\n\n"), std::string::npos) << text.GetText();
+                                            "         resource 'GPIB0::14::INSTR'\n\n\n"), std::string::npos) << state.GetText();
 }
 
 // Real images are read by the regeneration above.

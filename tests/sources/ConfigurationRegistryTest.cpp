@@ -4,6 +4,7 @@
 
 #include <string>
 
+#include "SimBench.h"
 #include "TempFolder.h"
 #include "sources/ConfigurationFile.h"
 #include "sources/VxipnpInfo.h"
@@ -13,12 +14,8 @@ using namespace sm;
 namespace {
 constexpr const char* vxipnpKey = "SOFTWARE\\VXIPNP_Alliance\\VXIPNP\\CurrentVersion";
 
-const std::string temp = [] {
-    char path[MAX_PATH];
-    ::GetTempPathA(MAX_PATH, path);
-    return std::string(path);
-}();
-const std::string registryFolder = temp + "SessionMgrRegistryVxipnp", environmentFolder = temp + "SessionMgrEnvironmentVxipnp";
+const std::string registryFolder = sm::testing::TempPath("SessionMgrRegistryVxipnp"),
+                  environmentFolder = sm::testing::TempPath("SessionMgrEnvironmentVxipnp");
 
 class RegistryDirectory : public ::testing::Test {
 protected:

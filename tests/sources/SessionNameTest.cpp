@@ -1,16 +1,11 @@
 // Name syntax: the category separator and the external-process prefixes.
 #include <gtest/gtest.h>
 
-#include "DoubleByteCodePage.h"
-
 #include <string>
 
-#include "framework/CodePage.h"
 #include "sources/SessionName.h"
 
 using namespace sm;
-using sm::testing::DoubleByteCodePage;
-using sm::testing::wideA;
 
 namespace {
 // FindCategorySeparator's position and length as "position/length"; a missing separator fails the calling test.
@@ -19,25 +14,16 @@ std::string SeparatorOf(const std::string& text) {
     EXPECT_TRUE(FindCategorySeparator(text, &position, &length)) << "text " << text;
     return std::to_string(position) + "/" + std::to_string(length);
 }
-
-// A Shift-JIS character whose trail byte is a backslash (0x5C).
-const std::string trailBackslash = "\x83\x5C";
 }  // namespace
 
 // The full rules of the separator and of the prefixes are the name fuzz rule's, replayed over its
-// corpus (FuzzReplay.SessionName); these rows pin one name of each form.
+// corpus with double-byte names too (FuzzReplay.SessionName); these rows pin one name of each form.
 TEST(CategorySeparator, EveryFormHasItsLength) {
     const struct { const char *text, *found; } cases[] = {
         {"VISA:GPIB0", "4/1"}, {"VISA::GPIB0", "4/2"}, {"VISA://GPIB0", "4/3"}, {"VISA/GPIB0", "4/1"},
         {"VISA\\\\GPIB0", "4/2"}, {"A:::B", "1/2"}, {"A/:B", "1/1"}, {"GPIB0::3/x", "5/2"}, {"::DMM1", "0/2"}};
     for (const auto& c : cases) EXPECT_EQ(SeparatorOf(c.text), c.found) << c.text;
     EXPECT_FALSE(FindCategorySeparator("DMM1", nullptr, nullptr));
-}
-
-TEST_F(DoubleByteCodePage, SeparatorPositionCountsCharactersAndATrailByteBackslashIsNoSeparator) {
-    EXPECT_EQ(SeparatorOf(wideA + wideA + "::x"), "2/2");
-    // A byte scan would stop inside the double-byte character at its 0x5C trail byte.
-    EXPECT_EQ(SeparatorOf(trailBackslash + trailBackslash + "::DMM"), "2/2");
 }
 
 TEST(ExternalPrefix, RecognisedForms) {
