@@ -109,7 +109,6 @@ TEST(RegistryOverrides, AbsoluteValuesReplaceTheDirectoryInTheirView) {
     EXPECT_EQ(getter.GetConfigDirectory("A", false).View(), "\\\\srv\\share\\cfg");
     EXPECT_EQ(getter.GetConfigDirectory("A", true).View(), getter.GetDefaultConfigDirectory().View());
     EXPECT_EQ(getter.GetPublicDirectory("A", true).View(), "P:\\public");
-    EXPECT_EQ(getter.GetPublicDirectory("A", false).View(), getter.GetPublicDirectory().View());
 }
 
 TEST(RegistryOverrides, EmptyAndRelativeValuesAreIgnored) {

@@ -62,8 +62,7 @@ TEST(PathText, DriveCompletionAppendAndParent) {
     EXPECT_EQ(Path("C:\\dir").AppendDirectory("Cfg").View(), "C:\\dir\\Cfg\\");
     EXPECT_EQ(Path("C:\\dir\\").EnsureTrailingSeparator().View(), "C:\\dir\\");
     for (auto [path, parent] : {std::pair{"C:\\a\\b", "C:\\a"}, {"C:\\a\\b\\", "C:\\a"}, {"C:\\a", "C:\\"}, {"C:\\", "C:\\"},
-                                {"\\\\srv\\share\\a", "\\\\srv\\share"},
-                                {"\\\\srv\\share", "\\\\srv\\share"}, {"dir\\file", "dir"}, {"file", ""}})
+                                {"\\\\srv\\share\\a", "\\\\srv\\share"}, {"\\\\srv\\share", "\\\\srv\\share"}, {"dir\\file", "dir"}, {"file", ""}})
         EXPECT_EQ(Path(path).Parent().View(), parent) << path;
     for (auto [path, absolute] : {std::pair{"C:", true}, {"\\\\srv\\share", true}, {"C:dir", false}, {"dir", false}})
         EXPECT_EQ(Path(path).IsAbsolute(), absolute) << path;
@@ -87,7 +86,6 @@ TEST(FileComparison, CopiesMatchAndAnyDifferenceIsFound) {
     lastByte.back() ^= 1;
     inSecondBlock[4096] ^= static_cast<char>(0x80);
     EXPECT_TRUE(FilesAreIdentical(original, folder.Write("copy.bin", content)));
-    EXPECT_TRUE(FilesAreIdentical(original, original));
     EXPECT_TRUE(FilesAreIdentical(folder.Write("empty1.bin", ""), folder.Write("empty2.bin", "")));
     for (const std::string& other : {lastByte, inSecondBlock, content + "x", content.substr(0, 9999)})
         EXPECT_FALSE(FilesAreIdentical(original, folder.Write("other.bin", other))) << other.size();
