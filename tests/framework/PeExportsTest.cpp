@@ -1,5 +1,4 @@
-// Export names read straight from image bytes: what counts as a name, every out-of-file reference
-// caught instead of read, and pages fetched only as they are needed.
+// Export names from image bytes: every out-of-file reference caught, pages fetched only as needed.
 #include <gtest/gtest.h>
 
 #include "CatchTE.h"
@@ -68,12 +67,16 @@ struct ImageBuilder {
     }
 };
 
-Names Read(const std::vector<unsigned char>& image) {
-    StringVector names;
-    ReadExportNames(image, names);
+Names Plain(const StringVector& names) {
     Names plain;
     for (const auto& name : names) plain.emplace_back(name.View());
     return plain;
+}
+
+Names Read(const std::vector<unsigned char>& image) {
+    StringVector names;
+    ReadExportNames(image, names);
+    return Plain(names);
 }
 
 void ExpectBadFormat(const std::vector<unsigned char>& image) {
@@ -83,15 +86,9 @@ void ExpectBadFormat(const std::vector<unsigned char>& image) {
 }
 }  // namespace
 
-TEST(ExportNames, SortedUniqueAndStartingWithALetterOrUnderscore) {
-    ImageBuilder builder{{"zeta_init", "abc_close", "_private", "1numeric", "?mangled@@", "abc_close", "Abc_Reset"}};
-    EXPECT_EQ(Read(builder.Build()), (Names{"Abc_Reset", "_private", "abc_close", "zeta_init"}));
-}
-
 TEST(ExportNames, ThirtyTwoBitImagesAndMissingDirectoriesGiveNone) {
     EXPECT_EQ(Read(ImageBuilder{{"abc_init"}, 0x10B}.Build()), Names{});
     EXPECT_EQ(Read(ImageBuilder{{"abc_init"}, 0x20B, false}.Build()), Names{});
-    EXPECT_EQ(Read(ImageBuilder{}.Build()), Names{});
 }
 
 TEST(ExportNames, EveryOutOfFileReferenceIsCaught) {
@@ -129,9 +126,7 @@ TEST(ExportNamesPaged, FetchesOnlyNeededPagesAndReadsNamesAcrossPageBoundaries) 
         fetchedBytes += count;
         return count;
     }, names);
-    ASSERT_EQ(names.size(), 2u);
-    EXPECT_EQ(std::string(names[0].View()), "drv_close_with_a_long_name");
-    EXPECT_EQ(std::string(names[1].View()), first);
+    EXPECT_EQ(Plain(names), (Names{"drv_close_with_a_long_name", first}));
     EXPECT_EQ(fetchedPages, (std::set<std::uint64_t>{0, 2, 3}));
     EXPECT_EQ(fetchedBytes, 3u * 16384u);
 }

@@ -1,5 +1,4 @@
-// What the fuzz targets share: a failed property stops the run with a message kept beside the
-// crashing input, and the first input byte picks the code page.
+// What the fuzz targets share: a failed property stops the run; the mode byte picks the code page.
 #pragma once
 
 #include <cstdint>

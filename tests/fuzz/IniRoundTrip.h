@@ -1,7 +1,8 @@
-// The INI round-trip rule, shared by the fuzz target (and its corpus replay) and the INI tests: a document
-// read from any text and written must read back with the same sections, items, names and values (a
-// quoted value stays quoted), and a second write-read must give the very same document. A document
-// the writer cannot carry faithfully must be refused with the writer's own codes, never written wrongly.
+// The INI round-trip rule of the fuzz target (and its corpus replay): a document read from any text and
+// written must read back with the same sections, items, names and values (a quoted value stays quoted),
+// and a second write-read must give the very same document. A document the writer cannot carry
+// faithfully must be refused with the writer's own codes, never written wrongly. Escaped free text
+// must come back from a value unchanged.
 #pragma once
 
 #include <string>
@@ -47,41 +48,55 @@ inline std::string LookupDifference(const IniObj& ini) {
     return "";
 }
 
-struct RoundTripResult {
-    bool refused = false;  // the writer refused the document, with one of its own codes
-    std::string failure;   // "" when the rule holds
-};
+// A refusal with one of the writer's own codes is how it declines a document it cannot carry.
+inline std::string RefusalDifference(const TEException& refused) {
+    const int code = refused.GetErrorCode();
+    return code == TE_OPERATION_FAILED || code == TE_INVALID_OR_OUT_OF_RANGE
+               ? "" : std::string("unexpected refusal: ") + refused.GetDescription();
+}
 
-// Writes the document, reads it back and writes and reads once more.
-inline RoundTripResult CheckRoundTrip(const IniObj& first, bool lfOnly) {
-    RoundTripResult result;
-    if (!(result.failure = LookupDifference(first)).empty()) return result;
-    std::string written;
-    try {
-        written = first.WriteString(lfOnly);
-    } catch (const TEException& refused) {
-        result.refused = true;
-        if (refused.GetErrorCode() != TE_OPERATION_FAILED && refused.GetErrorCode() != TE_INVALID_OR_OUT_OF_RANGE)
-            result.failure = std::string("unexpected refusal: ") + refused.GetDescription();
-        return result;
-    }
+// Writes the document, reads it back and writes and reads once more; "" when the rule holds.
+inline std::string RoundTripDifference(const IniObj& first, bool lfOnly) {
+    if (std::string failure = LookupDifference(first); !failure.empty()) return failure;
     IniObj second(first.IsSorted()), third(first.IsSorted());
-    second.ReadString(written);
-    if (!(result.failure = DocumentDifference(first, second, false)).empty()) return result;
+    try {
+        second.ReadString(first.WriteString(lfOnly));
+    } catch (const TEException& refused) {
+        return RefusalDifference(refused);
+    }
+    if (std::string failure = DocumentDifference(first, second, false); !failure.empty()) return failure;
     third.ReadString(second.WriteString(lfOnly));
-    result.failure = DocumentDifference(second, third, true);
-    return result;
+    return DocumentDifference(second, third, true);
+}
+
+// Free text without its NULs, escaped, survives unescaping, and as an item's value (bare or quoted)
+// a write and a read with the decoding Get.
+inline std::string EscapedTextDifference(std::string_view input, bool quoted, bool lfOnly) {
+    std::string text(input);
+    std::erase(text, '\0');
+    if (UnescapeIniText(EscapeIniText(text)) != text) return "escape round trip changed the text";
+    IniObj written, read;
+    try {
+        written.Put("S", "free", EscapeIniText(text), quoted);
+        read.ReadString(written.WriteString(lfOnly));
+    } catch (const TEException& refused) {
+        return RefusalDifference(refused);  // a lone lead byte at the end of a double-byte text
+    }
+    DynamicString value;
+    return read.Get("S", "free", value) && value.View() == text ? "" : "escaped value changed on write and read";
 }
 
 // The fuzz input form: the first byte picks the code page (bit 0: double-byte 932), the line ends
-// (bit 1: LF only) and the sorted index (bit 2); the rest is the text.
-inline RoundTripResult CheckRoundTripOfInput(std::string_view input) {
-    if (input.empty()) return {};
+// (bit 1: LF only), the sorted index (bit 2) and quoting of the escaped text (bit 3); the rest is the text.
+inline std::string CheckRoundTripOfInput(std::string_view input) {
+    if (input.empty()) return "";
     const unsigned mode = static_cast<unsigned char>(input[0]);
     SetMultiByteCodePage(mode & 1 ? 932 : 1252);
+    if (std::string failure = EscapedTextDifference(input.substr(1), (mode & 8) != 0, (mode & 2) != 0); !failure.empty())
+        return failure;
     IniObj first((mode & 4) != 0);
     first.ReadString(input.substr(1));
-    return CheckRoundTrip(first, (mode & 2) != 0);
+    return RoundTripDifference(first, (mode & 2) != 0);
 }
 
 }  // namespace sm::testing

@@ -1,7 +1,5 @@
-// libFuzzer target for the init-option rules: taking an option out of an option string removes one
-// run that starts with the option name and holds "=" and the value, and nothing else; a refusal
-// leaves the string alone; the boolean reading answers or raises its one message. Input: the mode
-// byte (bit 0: double-byte code page 932), the option name, a NUL, the options.
+// libFuzzer target for init options: one extraction removes one run (name, "=", value) and nothing else;
+// a refusal changes nothing; booleans answer or raise one message. Input: mode byte, name, NUL, options.
 #include <cstddef>
 #include <cstdint>
 #include <string>

@@ -1,5 +1,4 @@
-// The export-name reader's rule over arbitrary bytes, checked by the fuzz target and its corpus replay:
-// either sorted, unique names that start with a letter or "_", or a refusal with TE_BAD_FILE_FORMAT.
+// The export reader's rule: sorted, unique names starting with a letter or "_", or TE_BAD_FILE_FORMAT.
 #pragma once
 
 #include <string>

@@ -1,6 +1,4 @@
-// Runs a fuzz target's entry point once over every file of the corpus folders it is given, so the
-// normal builds check each corpus without libFuzzer. An empty corpus is a failure: a replay that
-// checked nothing must not pass.
+// Runs a fuzz target once over every file of its corpus folders, without libFuzzer; an empty corpus fails.
 #include <cstdint>
 #include <cstdio>
 #include <filesystem>

@@ -1,7 +1,5 @@
-// libFuzzer target for the configuration-file rules: any INI text either gives lists that keep the
-// rules of a virtual instrument (resource set, its own name first, logical names that point at it,
-// found again by name) or is refused with the invalid-boolean or invalid-path error, and parsing it
-// twice gives the same lists. The first input byte picks the code page (bit 0: 932); the rest is text.
+// libFuzzer target for the configuration-file rules: instruments keep their rules, or the text is refused
+// with the invalid-boolean or invalid-path error; a second parse gives the same. Input: mode byte, text.
 #include <cstddef>
 #include <cstdint>
 #include <string>

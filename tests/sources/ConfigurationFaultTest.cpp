@@ -1,10 +1,10 @@
-// The VXIplug&play directory from an empty registry value, and a configuration file that cannot be
-// written. The directory is resolved once per process: the tests run in declaration order.
+// An empty registry value and an unwritable configuration file; the tests run in declaration order.
 #include <gtest/gtest.h>
 #include <windows.h>
 
 #include <string>
 
+#include "SimBench.h"
 #include "sources/ConfigurationFile.h"
 
 using namespace sm;
@@ -12,11 +12,7 @@ using namespace sm;
 namespace {
 constexpr const char* vxipnpKey = "SOFTWARE\\VXIPNP_Alliance\\VXIPNP\\CurrentVersion";
 
-const std::string root = [] {
-    char temp[MAX_PATH];
-    ::GetTempPathA(MAX_PATH, temp);
-    return std::string(temp) + "SessionMgrConfigurationFaultTest";
-}();
+const std::string root = sm::testing::TempPath("SessionMgrConfigurationFaultTest");
 const std::string platform = root + "\\Win64";
 
 // Virtual instruments in the configuration: one per driver found.

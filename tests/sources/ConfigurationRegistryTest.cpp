@@ -1,10 +1,10 @@
-// The VXIplug&play directory from the registry: it wins over the environment, and the file is
-// regenerated in its platform folder.
+// The VXIplug&play directory from the registry wins over the environment and receives the file.
 #include <gtest/gtest.h>
 #include <windows.h>
 
 #include <string>
 
+#include "SimBench.h"
 #include "TempFolder.h"
 #include "sources/ConfigurationFile.h"
 #include "sources/VxipnpInfo.h"
@@ -14,12 +14,8 @@ using namespace sm;
 namespace {
 constexpr const char* vxipnpKey = "SOFTWARE\\VXIPNP_Alliance\\VXIPNP\\CurrentVersion";
 
-const std::string temp = [] {
-    char path[MAX_PATH];
-    ::GetTempPathA(MAX_PATH, path);
-    return std::string(path);
-}();
-const std::string registryFolder = temp + "SessionMgrRegistryVxipnp", environmentFolder = temp + "SessionMgrEnvironmentVxipnp";
+const std::string registryFolder = sm::testing::TempPath("SessionMgrRegistryVxipnp"),
+                  environmentFolder = sm::testing::TempPath("SessionMgrEnvironmentVxipnp");
 
 class RegistryDirectory : public ::testing::Test {
 protected:

@@ -1,5 +1,4 @@
-// The VISA name groups: which resource a VISA logical name joins, and their state text. Plain rules,
-// run natively and under Wine.
+// The VISA name groups: which resource a VISA logical name joins, and their state text.
 #include <gtest/gtest.h>
 
 #include "sources/VisaEntry.h"

@@ -1,5 +1,4 @@
-// A machine without a VISA library (ctest disables visa32.dll for this process in Wine's loader):
-// the binding's own status texts, and the error a VISA listing then reports.
+// No VISA library (ctest disables visa32.dll for this process): built-in status texts, listing error.
 #include <gtest/gtest.h>
 
 #include "com/ComClient.h"
