@@ -77,8 +77,7 @@ TEST(IniLines, EndAtLfCrOrNulAndPairedEndsCountOnce) {
 
 TEST(IniLines, PairedEndsSplitAcrossBlocksAndLongLines) {
     for (std::string ending : {"\r\n", "\n\r"}) {
-        // The filler line ends 300 bytes before the block does, so the second line's CR or LF is the
-        // block's last byte.
+        // The second line's CR or LF is the block's last byte.
         std::string filler = std::string(LineStream::blockBytes - 301, 'f') + "\n", second(299, 'x');
         EXPECT_EQ(Lines(filler + second + ending + "next"), (Texts{f640, second, "next"}));
     }
@@ -318,5 +317,4 @@ TEST(IniFiles, FailedReadsNameTheFileAndLeaveTheDocumentAsItWas) {
     EXPECT_EQ(Describe(ini), "[S]{k=1}");
 }
 
-// Generated documents and escaped free text, read, written and read back, are checked by the INI fuzz
-// rule over its corpus, which holds double-byte inputs too: FuzzReplay.Ini.
+// Generated documents and escaped free text: the INI fuzz rule over its corpus (FuzzReplay.Ini).

@@ -6,8 +6,7 @@
 
 using namespace sm;
 
-// The option rules themselves are the fuzz rule's, replayed over its corpus (FuzzReplay.InitOptions),
-// which cannot tell a refusal of a valid option from a correct one: one option is taken here.
+// The rules are the fuzz rule's (FuzzReplay.InitOptions), which cannot tell a wrong refusal: one here.
 TEST(InitOptionsTest, TakesAPairThroughItsCommaWithItsValueTrimmed) {
     DynamicString options("Simulate=1, IdQuery = 0"), value;
     ASSERT_TRUE(ExtractInitOption(options, "idquery", value));

@@ -1,8 +1,5 @@
-// The INI round-trip rule of the fuzz target (and its corpus replay): a document read from any text and
-// written must read back with the same sections, items, names and values (a quoted value stays quoted),
-// and a second write-read must give the very same document. A document the writer cannot carry
-// faithfully must be refused with the writer's own codes, never written wrongly. Escaped free text
-// must come back from a value unchanged.
+// The INI round-trip rule (docs/fuzzing.md): what is read, written and read back is the same document,
+// or the writer refuses it with its own codes; escaped free text comes back from a value unchanged.
 #pragma once
 
 #include <string>
@@ -14,8 +11,7 @@
 
 namespace sm::testing {
 
-// What differs between two documents, or "" when nothing does. With exactQuotes the quoted flags
-// must match too; without, a bare value may have become quoted.
+// What differs between two documents, or ""; without exactQuotes a bare value may have become quoted.
 inline std::string DocumentDifference(const IniObj& first, const IniObj& second, bool exactQuotes) {
     const auto& a = first.GetSections();
     const auto& b = second.GetSections();
@@ -69,8 +65,7 @@ inline std::string RoundTripDifference(const IniObj& first, bool lfOnly) {
     return DocumentDifference(second, third, true);
 }
 
-// Free text without its NULs, escaped, survives unescaping, and as an item's value (bare or quoted)
-// a write and a read with the decoding Get.
+// Free text without its NULs, escaped, survives unescaping and, as a value, a write and a read.
 inline std::string EscapedTextDifference(std::string_view input, bool quoted, bool lfOnly) {
     std::string text(input);
     std::erase(text, '\0');
@@ -86,8 +81,7 @@ inline std::string EscapedTextDifference(std::string_view input, bool quoted, bo
     return read.Get("S", "free", value) && value.View() == text ? "" : "escaped value changed on write and read";
 }
 
-// The fuzz input form: the first byte picks the code page (bit 0: double-byte 932), the line ends
-// (bit 1: LF only), the sorted index (bit 2) and quoting of the escaped text (bit 3); the rest is the text.
+// The first byte's bits: 0 code page 932, 1 LF line ends, 2 sorted, 3 quoted escaped text.
 inline std::string CheckRoundTripOfInput(std::string_view input) {
     if (input.empty()) return "";
     const unsigned mode = static_cast<unsigned char>(input[0]);

@@ -1,5 +1,4 @@
-// libFuzzer target for init options: one extraction removes one run (name, "=", value) and nothing else;
-// a refusal changes nothing; booleans answer or raise one message. Input: mode byte, name, NUL, options.
+// Init options (docs/fuzzing.md). Input: mode byte, name, NUL, options.
 #include <cstddef>
 #include <cstdint>
 #include <string>

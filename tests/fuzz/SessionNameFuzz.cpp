@@ -1,5 +1,4 @@
-// libFuzzer target for the name syntax: the category separator and the external-process prefixes.
-// Input: mode byte (bit 0: code page 932), then the name.
+// Name syntax (docs/fuzzing.md). Input: mode byte (bit 0: code page 932), then the name.
 #include <cstddef>
 #include <cstdint>
 #include <string>

@@ -1,5 +1,4 @@
-// libFuzzer target for the configuration-file rules: instruments keep their rules, or the text is refused
-// with the invalid-boolean or invalid-path error; a second parse gives the same. Input: mode byte, text.
+// Configuration-file rules (docs/fuzzing.md). Input: mode byte, text.
 #include <cstddef>
 #include <cstdint>
 #include <string>

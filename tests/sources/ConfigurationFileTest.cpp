@@ -1,5 +1,4 @@
-// The configuration file under Wine: regeneration, re-reading by write time. VXIPNPPATH is read once per
-// process, so the tests run in declaration order, each setting up the files it needs.
+// The configuration file under Wine. VXIPNPPATH is read once per process: the tests run in order.
 #include <gtest/gtest.h>
 #include <windows.h>
 
@@ -111,8 +110,7 @@ TEST(ConfigurationFile, NewerWriteTimeIsReadAgainAndOlderIsNot) {
     EXPECT_EQ(CurrentGeneration(), before);
     SetWriteTime(file, 3600);
     EXPECT_EQ(CurrentGeneration(), before + 1);
-    // What was read again shows in the source's text; its head (file, directories) is checked by the
-    // listing and registry tests.
+    // What was read again shows in the source's text.
     VxipnpInfo source;
     DynamicString state;
     source.AppendStateDescription(state);

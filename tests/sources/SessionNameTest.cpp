@@ -16,8 +16,7 @@ std::string SeparatorOf(const std::string& text) {
 }
 }  // namespace
 
-// The full rules of the separator and of the prefixes are the name fuzz rule's, replayed over its
-// corpus with double-byte names too (FuzzReplay.SessionName); these rows pin one name of each form.
+// The full rules are the name fuzz rule's (FuzzReplay.SessionName); one name of each form here.
 TEST(CategorySeparator, EveryFormHasItsLength) {
     const struct { const char *text, *found; } cases[] = {
         {"VISA:GPIB0", "4/1"}, {"VISA::GPIB0", "4/2"}, {"VISA://GPIB0", "4/3"}, {"VISA/GPIB0", "4/1"},
