@@ -41,16 +41,6 @@ TEST(StationCommandLine, RefusesWhatItDoesNotUnderstand) {
     EXPECT_EQ(error, "option --key needs a value");
 }
 
-TEST(StationCommandLine, HelpIsAnsweredForEveryCommandWithoutItsArguments) {
-    for (const CommandSyntax& syntax : Commands()) {
-        auto line = Parse({syntax.name, "--help"});
-        ASSERT_TRUE(line) << syntax.name;
-        EXPECT_TRUE(line->help);
-        EXPECT_NE(CommandHelp(syntax).find(syntax.usage), std::string::npos);
-    }
-    EXPECT_TRUE(Parse({})->help);
-}
-
 TEST(StationJson, EscapesEverythingAStateTextCanHold) {
     // Fault caught: state texts carry line breaks, tabs, quotes and Windows paths.
     EXPECT_EQ(JsonString("a\"b\\c\nd\te\x01"), "\"a\\\"b\\\\c\\nd\\te\\u0001\"");

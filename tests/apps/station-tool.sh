@@ -41,8 +41,6 @@ expect unresolved-json err '{"error":-17304,"message":"'"'"'VXIPNP::NoSuchInstru
 
 run categories 0 categories --json
 expect categories out '"CUSTOM"'
-run state 0 state
-expect state out "In Process State:"
 
 # A session of the shared external process, locked by another program: the tool sees the lock, is
 # refused it, and breaks it.

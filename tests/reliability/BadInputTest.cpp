@@ -125,8 +125,7 @@ TEST_P(BadInput, FlagsOtherThanMinusOneAreTrue) {
 TEST_P(BadInput, EnumerationsOutOfRange) {
     UniqueSafeArray names;
     ExpectAnswer(manager->GetNames(Wide(L"CUSTOM").Get(), static_cast<GetNamesOptions>(-1), nullptr, names.Put()), S_OK);
-    // A driver level beyond the range gives no driver.
-    ComPtr<IUnknown> driver;
+    ComPtr<IUnknown> driver;  // a level beyond the range gives no driver
     ExpectAnswer(session->GetCOMDriver(static_cast<InterfaceLevel>(4), driver.Put()), S_OK);
     EXPECT_FALSE(driver);
 }
