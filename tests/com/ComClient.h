@@ -12,9 +12,8 @@ namespace sm::testing {
 
 inline ComPtr<IInstrSessionMgr> CreateManager() {
     ComPtr<IInstrSessionMgr> manager;
-    HRESULT created = ::CoCreateInstance(CLSID_InstrSessionMgr, nullptr, CLSCTX_INPROC_SERVER, IID_IInstrSessionMgr,
-                                         manager.PutVoid());
-    EXPECT_EQ(created, S_OK) << "is the DLL registered in this prefix?";
+    EXPECT_EQ(::CoCreateInstance(CLSID_InstrSessionMgr, nullptr, CLSCTX_INPROC_SERVER, IID_IInstrSessionMgr, manager.PutVoid()),
+              S_OK) << "is the DLL registered in this prefix?";
     return manager;
 }
 
@@ -25,9 +24,8 @@ inline std::string Text(BSTR text) { return BstrToMultiByte(text); }
 // Asks the manager for a session; fails the test on an error.
 inline ComPtr<IInstrSession> GetSession(IInstrSessionMgr* manager, const wchar_t* name, bool newSession = false) {
     ComPtr<IInstrSession> session;
-    auto bstr = Bstr(name);
-    HRESULT result = manager->GetInstrSession(bstr.Get(), newSession ? VARIANT_TRUE : VARIANT_FALSE, session.Put());
-    EXPECT_EQ(result, S_OK) << TakeErrorInfo().description;
+    EXPECT_EQ(manager->GetInstrSession(Bstr(name).Get(), newSession ? VARIANT_TRUE : VARIANT_FALSE, session.Put()), S_OK)
+        << TakeErrorInfo().description;
     return session;
 }
 

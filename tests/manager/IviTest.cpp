@@ -1,5 +1,4 @@
-// IVI names and sessions over the stand-in IVI configuration library and drivers in the prefix; the
-// store is this program's setup file, the init defaults a configuration file in a directory of its own.
+// IVI names and sessions over the stand-in configuration library and drivers installed in the prefix.
 #include "SimBench.h"
 #include "com/ComClient.h"
 

@@ -1,5 +1,4 @@
-// The manager's listings through its vtable over a VXIplug&play configuration, also from another
-// apartment. The manager and its hidden flags outlive a test: each test ends with every category visible.
+// The manager's listings; its hidden flags outlive a test, so each test ends with every category visible.
 #include <gtest/gtest.h>
 
 #include <algorithm>

@@ -107,6 +107,14 @@ TEST_F(CustomSession, DataItemsOfEveryKindRoundTripAndIdsAreCaseSensitive) {
     EXPECT_EQ(session->GetLongPtr(Bstr(L"Unsigned").Get(), unsignedPointer.Get()), S_OK);
     EXPECT_EQ(std::make_pair(pointer->vt, pointer->llVal), std::make_pair(VARTYPE(VT_I8), 0x1234567890ABCDEFll));
     EXPECT_EQ(unsignedPointer->llVal, -1);
+    // Generated IDs count per session: a session made now starts at 1 again.
+    auto fresh = GetSession(manager.Get(), L"CUSTOM::SessionTest", true);
+    std::string generated;
+    for (IInstrSession* from : {session.Get(), session.Get(), fresh.Get()}) {
+        EXPECT_EQ(from->GenerateUniqueID(text.Put()), S_OK);
+        generated += Text(text.Get()) + " ";
+    }
+    EXPECT_EQ(generated, "UniqueId1 UniqueId2 UniqueId1 ");
 }
 
 TEST_F(CustomSession, DuplicateIdsAreRejectedAndKeepTheFirstValue) {
