@@ -16,6 +16,7 @@
 #include "com/ComPtr.h"
 #include "com/LibraryBinding.h"
 #include "com/UniqueHandles.h"
+#include "sources/IviConfigFunctions.h"
 #include "sources/RQEngine.h"
 
 namespace bench {
@@ -78,101 +79,85 @@ private:
 class IviStore {
 public:
     IviStore() {
-        char system[MAX_PATH] = {};
-        UINT length = ::GetSystemDirectoryA(system, MAX_PATH);
-        library.Reset(::LoadLibraryA((std::string(system, length < MAX_PATH ? length : 0) + "\\iviconfig.dll").c_str()));
+        library.Reset(::LoadLibraryA(sm::SystemDirectoryPath("iviconfig.dll").c_str()));
         if (!library) return;
         HMODULE module = library.Get();
-        Bind(module, openIniFile, "IviIni_OpenIniFile");
-        Bind(module, closeIniFile, "IviIni_CloseIniFile");
-        Bind(module, configurationChanged, "IviIni_ConfigurationChanged");
-        Bind(module, reloadConfiguration, "IviIni_ReloadConfiguration");
-        Bind(module, getNumberOfVIs, "IviIni_GetNumberOfVIs");
-        Bind(module, getNthVI, "IviIni_GetNthVI");
-        Bind(module, getVIDriver, "IviIni_GetVIDriver");
-        Bind(module, getDriverPrefix, "IviIni_GetDriverPrefix");
-        Bind(module, getDriverModule, "IviIni_GetDriverModule");
-        Bind(module, getDriverClass, "IviIni_GetDriverClass");
-        Bind(module, getDriverClassCount, "IviIni_GetDriverClassCount");
-        Bind(module, getDriverClassByIndex, "IviIni_GetDriverClassByIndex");
-        Bind(module, getNumberOfLogicalNames, "IviIni_GetNumberOfLogicalNames");
-        Bind(module, getNthLogicalName, "IviIni_GetNthLogicalName");
-        Bind(module, getLogicalNameVI, "IviIni_GetLogicalNameVI");
-        if (openIniFile) openIniFile("", &handle);
+        Bind(module, functions.openIniFile, "IviIni_OpenIniFile");
+        Bind(module, functions.closeIniFile, "IviIni_CloseIniFile");
+        Bind(module, functions.configurationChanged, "IviIni_ConfigurationChanged");
+        Bind(module, functions.reloadConfiguration, "IviIni_ReloadConfiguration");
+        Bind(module, functions.getNumberOfVIs, "IviIni_GetNumberOfVIs");
+        Bind(module, functions.getNthVI, "IviIni_GetNthVI");
+        Bind(module, functions.getVIDriver, "IviIni_GetVIDriver");
+        Bind(module, functions.getDriverPrefix, "IviIni_GetDriverPrefix");
+        Bind(module, functions.getDriverModule, "IviIni_GetDriverModule");
+        Bind(module, functions.getDriverClass, "IviIni_GetDriverClass");
+        Bind(module, functions.getDriverClassCount, "IviIni_GetDriverClassCount");
+        Bind(module, functions.getDriverClassByIndex, "IviIni_GetDriverClassByIndex");
+        Bind(module, functions.getNumberOfLogicalNames, "IviIni_GetNumberOfLogicalNames");
+        Bind(module, functions.getNthLogicalName, "IviIni_GetNthLogicalName");
+        Bind(module, functions.getLogicalNameVI, "IviIni_GetLogicalNameVI");
+        if (functions.openIniFile) functions.openIniFile("", &handle);
     }
     ~IviStore() {
-        if (handle && closeIniFile) closeIniFile(handle, 0);
+        if (handle && functions.closeIniFile) functions.closeIniFile(handle, 0);
     }
     IviStore(const IviStore&) = delete;
     IviStore& operator=(const IviStore&) = delete;
 
     bool Usable() const {
-        return handle && configurationChanged && reloadConfiguration && getNumberOfVIs && getNthVI && getVIDriver &&
-               getDriverPrefix && getDriverModule && (getDriverClass || getDriverClassCount) &&
-               getNumberOfLogicalNames && getNthLogicalName && getLogicalNameVI;
+        const sm::IviConfigFunctions& f = functions;
+        return handle && f.configurationChanged && f.reloadConfiguration && f.getNumberOfVIs && f.getNthVI && f.getVIDriver &&
+               f.getDriverPrefix && f.getDriverModule && (f.getDriverClass || f.getDriverClassCount) &&
+               f.getNumberOfLogicalNames && f.getNthLogicalName && f.getLogicalNameVI;
     }
     void Changed() const {
         unsigned char changed = 0;
-        configurationChanged(handle, &changed);
+        functions.configurationChanged(handle, &changed);
     }
-    void Reload() const { reloadConfiguration(handle); }
+    void Reload() const { functions.reloadConfiguration(handle); }
     // The calls of one read of the store, in the manager's order; returns the instruments read.
     std::int32_t Read() const {
         char text[1024];
         std::int32_t logicalCount = 0;
-        getNumberOfLogicalNames(handle, &logicalCount);
+        functions.getNumberOfLogicalNames(handle, &logicalCount);
         for (std::int32_t index = 1; index <= logicalCount; ++index) {
             const char* name = nullptr;
-            getNthLogicalName(handle, index, &name);
+            functions.getNthLogicalName(handle, index, &name);
             std::string logicalName(name ? name : "");
-            getLogicalNameVI(handle, logicalName.c_str(), text, sizeof text);
+            functions.getLogicalNameVI(handle, logicalName.c_str(), text, sizeof text);
         }
         std::int32_t count = 0;
-        getNumberOfVIs(handle, &count);
+        functions.getNumberOfVIs(handle, &count);
         for (std::int32_t index = 1; index <= count; ++index) {
             const char* name = nullptr;
-            getNthVI(handle, index, &name);
+            functions.getNthVI(handle, index, &name);
             std::string instrument(name ? name : "");
             char driver[1024] = {};
-            getVIDriver(handle, instrument.c_str(), driver, sizeof driver);
+            functions.getVIDriver(handle, instrument.c_str(), driver, sizeof driver);
             driver[sizeof driver - 1] = '\0';
-            getDriverPrefix(handle, driver, text, sizeof text);
-            getDriverModule(handle, driver, text, sizeof text);
-            if (!getDriverClassCount || !getDriverClassByIndex) {
-                getDriverClass(handle, driver, text, sizeof text);
+            functions.getDriverPrefix(handle, driver, text, sizeof text);
+            functions.getDriverModule(handle, driver, text, sizeof text);
+            if (!functions.getDriverClassCount || !functions.getDriverClassByIndex) {
+                functions.getDriverClass(handle, driver, text, sizeof text);
                 continue;
             }
             std::int32_t classes = 0;
-            getDriverClassCount(handle, driver, &classes);
+            functions.getDriverClassCount(handle, driver, &classes);
             for (std::int32_t which = 1; which <= classes; ++which)
-                getDriverClassByIndex(handle, driver, which, text, sizeof text);
+                functions.getDriverClassByIndex(handle, driver, which, text, sizeof text);
         }
         return count;
     }
 
 private:
-    using Status = std::int32_t;
     template <class Function>
     static void Bind(HMODULE module, Function*& slot, const char* name) {
         slot = sm::GetProcAddressAs<Function>(module, name);
     }
     sm::UniqueModule library;
     void* handle = nullptr;
-    Status (*openIniFile)(const char*, void**) = nullptr;
-    Status (*closeIniFile)(void*, std::int32_t) = nullptr;
-    Status (*configurationChanged)(void*, unsigned char*) = nullptr;
-    Status (*reloadConfiguration)(void*) = nullptr;
-    Status (*getNumberOfVIs)(void*, std::int32_t*) = nullptr;
-    Status (*getNthVI)(void*, std::int32_t, const char**) = nullptr;
-    Status (*getVIDriver)(void*, const char*, char*, std::int32_t) = nullptr;
-    Status (*getDriverPrefix)(void*, const char*, char*, std::int32_t) = nullptr;
-    Status (*getDriverModule)(void*, const char*, char*, std::int32_t) = nullptr;
-    Status (*getDriverClass)(void*, const char*, char*, std::int32_t) = nullptr;
-    Status (*getDriverClassCount)(void*, const char*, std::int32_t*) = nullptr;
-    Status (*getDriverClassByIndex)(void*, const char*, std::int32_t, char*, std::int32_t) = nullptr;
-    Status (*getNumberOfLogicalNames)(void*, std::int32_t*) = nullptr;
-    Status (*getNthLogicalName)(void*, std::int32_t, const char**) = nullptr;
-    Status (*getLogicalNameVI)(void*, const char*, char*, std::int32_t) = nullptr;
+    sm::IviConfigFunctions functions;
 };
 
 // Switch: the engine calls of one listing with the device names, route groups, routes and logical

@@ -4,7 +4,17 @@
 
 #include <windows.h>
 
+#include <string>
+
 namespace sm {
+
+// A library's full path in the system directory, where a library that must not be taken from the
+// search path is loaded from.
+inline std::string SystemDirectoryPath(const char* libraryName) {
+    char system[MAX_PATH] = {};
+    UINT length = ::GetSystemDirectoryA(system, MAX_PATH);
+    return std::string(system, length < MAX_PATH ? length : 0) + "\\" + libraryName;
+}
 
 // Null when the library does not export the name.
 template <class Function>

@@ -5,6 +5,7 @@
 #include <array>
 #include <type_traits>
 
+#include "com/LibraryBinding.h"
 #include "com/ModuleLock.h"
 #include "framework/MultiByte.h"
 #include "framework/TEException.h"
@@ -64,11 +65,7 @@ IviInfo::~IviInfo() {
 
 void IviInfo::LoadFunctionPointers() {
     if (library.IsLoaded()) return;
-    std::array<char, MAX_PATH> system{};
-    UINT length = ::GetSystemDirectoryA(system.data(), MAX_PATH);
-    std::string path(system.data(), length < MAX_PATH ? length : 0);
-    path += "\\iviconfig.dll";
-    library.Load(path.c_str(), "IviInfo::LoadFunctionPointers");
+    library.Load(SystemDirectoryPath("iviconfig.dll").c_str(), "IviInfo::LoadFunctionPointers");
     try {
         Functions bound;
         auto bind = [&](auto*& slot, const char* name) {

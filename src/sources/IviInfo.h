@@ -9,6 +9,7 @@
 
 #include "com/DriverLibrary.h"
 #include "sources/InfoBase.h"
+#include "sources/IviConfigFunctions.h"
 #include "sources/IviEntry.h"
 
 namespace sm {
@@ -33,23 +34,7 @@ public:
 private:
     using Handle = void*;
     using Status = std::int32_t;
-    struct Functions {
-        Status (*closeIniFile)(Handle, std::int32_t) = nullptr;
-        Status (*openIniFile)(const char*, Handle*) = nullptr;
-        Status (*configurationChanged)(Handle, unsigned char*) = nullptr;
-        Status (*reloadConfiguration)(Handle) = nullptr;
-        Status (*getNumberOfVIs)(Handle, std::int32_t*) = nullptr;
-        Status (*getNthVI)(Handle, std::int32_t, const char**) = nullptr;
-        Status (*getVIDriver)(Handle, const char*, char*, std::int32_t) = nullptr;
-        Status (*getDriverPrefix)(Handle, const char*, char*, std::int32_t) = nullptr;
-        Status (*getDriverModule)(Handle, const char*, char*, std::int32_t) = nullptr;
-        Status (*getDriverClass)(Handle, const char*, char*, std::int32_t) = nullptr;
-        Status (*getDriverClassCount)(Handle, const char*, std::int32_t*) = nullptr;
-        Status (*getDriverClassByIndex)(Handle, const char*, std::int32_t, char*, std::int32_t) = nullptr;
-        Status (*getNumberOfLogicalNames)(Handle, std::int32_t*) = nullptr;
-        Status (*getNthLogicalName)(Handle, std::int32_t, const char**) = nullptr;
-        Status (*getLogicalNameVI)(Handle, const char*, char*, std::int32_t) = nullptr;
-    };
+    using Functions = IviConfigFunctions;
 
     void LoadFunctionPointers();
     void UnloadLibrary();
