@@ -181,9 +181,9 @@ bool Setup::Has(const std::string& area, const std::string& object, const std::s
     return false;
 }
 
-void Count(const std::string& name) {
+void Count(const std::string& name, long step) {
     std::lock_guard<std::mutex> guard(StateLock());
-    ++Counters()[name];
+    Counters()[name] += step;
 }
 
 long Counter(const std::string& name) {

@@ -51,8 +51,9 @@ std::vector<std::string> SplitList(const std::string& text);
 // signed 32-bit value, as VISA and IVI statuses are).
 long ParseNumber(const std::string& text, long fallback = 0);
 
-// Process-wide call counters that tests read through the stand-in's exported SimCounter.
-void Count(const std::string& name);
+// Process-wide call counters that tests read through the stand-in's exported SimCounter. Every
+// stand-in also keeps "open": the handles it gave out that nobody has closed (a step of -1 closes).
+void Count(const std::string& name, long step = 1);
 long Counter(const std::string& name);
 void ResetCounters();
 

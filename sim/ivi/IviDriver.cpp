@@ -46,6 +46,7 @@ ViStatus Open(const std::string& call, ViSession* session) {
     sim::Count(prefix + "_" + call);
     ViStatus status = static_cast<ViStatus>(Setting("InitStatus"));
     *session = status < 0 ? 0 : static_cast<ViSession>(Setting("Session", 0x1001));
+    if (status >= 0) sim::Count("open");
     return status;
 }
 
@@ -68,6 +69,7 @@ SIM_EXPORT(InitWithOptions)(const char* resource, ViBoolean idQuery, ViBoolean r
 
 SIM_EXPORT(close)(ViSession) {
     Count("close");
+    sim::Count("open", -1);
     return static_cast<ViStatus>(Setting("CloseStatus"));
 }
 

@@ -30,10 +30,14 @@ struct Entry {
 };
 
 struct Object {
-    explicit Object(Kind what) : kind(what) { sim::Count("ObjectsCreated"); }
+    explicit Object(Kind what) : kind(what) {
+        sim::Count("ObjectsCreated");
+        sim::Count("open");
+    }
     ~Object() {
         mark = deadMark;
         sim::Count("ObjectsDestroyed");
+        sim::Count("open", -1);
     }
     std::uint32_t mark = liveMark;
     Kind kind;

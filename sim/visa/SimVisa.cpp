@@ -95,6 +95,7 @@ ViSession nextHandle = 0x1000;
 ViSession Add(Object object) {
     ViSession handle = nextHandle++;
     objects[handle] = std::move(object);
+    sim::Count("open");
     return handle;
 }
 
@@ -349,11 +350,14 @@ ViStatus viClose(ViObject vi) {
                 ++child;
                 continue;
             }
+            // Its find lists go with it, as VISA defines; an instrument session left to it stays open.
             if (child->second.kind == Kind::Instrument) sim::Count("viClose RM before INSTR");
+            else sim::Count("open", -1);
             child = objects.erase(child);
         }
     }
     objects.erase(vi);
+    sim::Count("open", -1);
     return Success;
 }
 

@@ -76,7 +76,7 @@ ViStatus SimInit(const char* resource, std::uint16_t idQuery, std::uint16_t rese
     auto session = static_cast<ViSession>(setup.GetLong("VXIPNP", object, "Session", 0x1000));
     {
         std::lock_guard<std::mutex> guard(openLock);
-        openSessions.insert(session);
+        if (openSessions.insert(session).second) sim::Count("open");
     }
     if (vi) *vi = session;
     return status;
@@ -85,7 +85,9 @@ ViStatus SimInit(const char* resource, std::uint16_t idQuery, std::uint16_t rese
 ViStatus SimClose(ViSession vi) {
     sim::Count("close");
     std::lock_guard<std::mutex> guard(openLock);
-    return openSessions.erase(vi) ? successStatus : invalidSession;
+    if (!openSessions.erase(vi)) return invalidSession;
+    sim::Count("open", -1);
+    return successStatus;
 }
 
 ViStatus SimReset(ViSession vi) {

@@ -56,6 +56,7 @@ constexpr unsigned long typeMismatch = 0xFFFFBC57;       // -17321
 constexpr unsigned long invalidPointer = 0xFFFFBC3E;     // -17346
 constexpr unsigned long timedOut = 0xFFFFBC06;           // -17402
 constexpr unsigned long operationFailed = 0xFFFFBBA4;    // -17500
+inline HRESULT Code(std::int32_t code) { return static_cast<HRESULT>(code); }  // a TE code as the caller sees it
 
 // The elements of a one-dimensional array from 0 of this element type, the only valid listing. Under
 // Wine an array that crossed an apartment loses its element type (not its elements): pass VT_EMPTY.
