@@ -29,7 +29,8 @@ const std::string configuration =
     Instrument("AbsentDMM", "simdmm", "GPIB0::99::INSTR") + Instrument("NoClose", "simnoclose", "GPIB0::14::INSTR") +
     Instrument("Missing", "absent", "GPIB0::14::INSTR") + Instrument("Corrupt", "corrupt", "GPIB0::14::INSTR");
 
-// The store's change count moves with every change, so the product reads it again.
+// The store's change count moves with every change, so the product reads it again. Its library
+// predates the class-count functions.
 std::string Store(int changeCount, const std::string& extra = "") {
     return "[IVI]\nMissing = IviIni_GetDriverClassCount\nChangeCount = " + std::to_string(changeCount) + "\n" + extra +
            "[IVI Instrument DMM1]\nDriverSession = Dmm\n[IVI DriverSession Dmm]\nPrefix = simdmm\nClass = IviDmm\n"
@@ -51,7 +52,7 @@ const bool benchReady = [] {
     ::RegCloseKey(key);
     UseConfigurationFile("SessionMgrFaultTable", configuration);
     ::CreateDirectoryA(bin.c_str(), nullptr);
-    for (std::string driver : {SIM_SIMDMM, SIM_SIMNOCLOSE})
+    for (std::string driver : {SIM_SIMDMM, SIM_SIMNOCLOSE, SCAN_STANDARD})
         ::CopyFileA(driver.c_str(), (bin + "\\" + driver.substr(driver.find_last_of("/\\") + 1)).c_str(), FALSE);
     std::ofstream(bin + "\\corrupt_64.dll") << "MZ but no image follows";
     UseBench();
@@ -93,12 +94,19 @@ bool Matches(const Answer& actual, const Answer& expected) {
 }
 
 const Row rows[] = {
-    // Without the engine and the library no switch name is offered, and a switch session cannot open.
+    // Without the engine and the library no switch name is offered and a switch session cannot open;
+    // with them back, it opens: the failed load is not remembered.
     {"no switch product", [](IInstrSessionMgr* manager) {
-         EngineUnregistered engine;
-         LibraryHidden hidden("qvrq.dll");
-         EXPECT_EQ(ListNames(manager, L"RQ", ReturnVirtualInstruments | ReturnRoutes), Texts{});
-         return Initialize(manager, L"RQ::DmmToDut");
+         ComPtr<IInstrSession> session = GetSession(manager, L"RQ::DmmToDut");
+         Answer answer;
+         {
+             EngineUnregistered engine;
+             LibraryHidden hidden("qvrq.dll");
+             EXPECT_EQ(ListNames(manager, L"RQ", ReturnVirtualInstruments | ReturnRoutes), Texts{});
+             answer = AnswerOf(session->Initialize(nullptr));
+         }
+         EXPECT_EQ(session->Initialize(nullptr), S_OK);
+         return answer;
      }, {Code(TE_DLL_NOT_LOADABLE), LoadFailure("qvrq.dll", 126)}, true},
     {"no VISA library", [](IInstrSessionMgr* manager) {
          LibraryHidden hidden("visa32.dll");
@@ -113,19 +121,13 @@ const Row rows[] = {
          UseBench(Store(2, "OpenFails = 1\n"));
          UniqueSafeArray names;
          Answer answer = AnswerOf(manager->GetCategories(Bstr(L"IVI").Get(), names.Put()));
-         UseBench();
-         EXPECT_EQ(ListCategories(manager, L"IVI"), (Texts{"IviDmm"})) << "not tried again";
+         UseBench();  // tried again; without the class-count functions each instrument has its one class
+         EXPECT_EQ(ListNames(manager, L"IVI", ReturnVirtualInstruments | IncludeCategoryPrefix),
+                   (Texts{"IVI::::Multi", "IVI::IviDmm::DMM1"}));
          return answer;
      }, {0xFFFFBBA3, "The Quillvane Dovekit may not be installed. The installer for the Dovekit is located on the "
                      "Quillvane Driver CD-ROM.\n"}},
-    // The configuration library predates the class-count functions: each instrument has its one class.
-    {"IVI library without class counts", [](IInstrSessionMgr* manager) {
-         EXPECT_EQ(ListNames(manager, L"IVI", ReturnVirtualInstruments | IncludeCategoryPrefix),
-                   (Texts{"IVI::::Multi", "IVI::IviDmm::DMM1"}));
-         return Answer{};
-     }, {}},
     {"IVI store changed between two calls", [](IInstrSessionMgr* manager) {
-         EXPECT_EQ(ListNames(manager, L"IVI", ReturnVirtualInstruments), (Texts{"Multi", "DMM1"}));
          UseBench(Store(3));
          ComPtr<IInstrSession> session;
          Answer answer = AnswerOf(manager->GetInstrSession(Bstr(L"IVI::Multi").Get(), VARIANT_FALSE, session.Put()));
@@ -188,11 +190,9 @@ const Row rows[] = {
      }, {Code(TE_UNABLE_TO_OPEN_FILE), "Could Not Open File For Reading\nError reading from file '" + configurationPath + "'."},
      false, true},
     // A folder of the file's name makes the file unwritable: the regenerated text is served from memory,
-    // without a new scan at every request, until the directory changes.
+    // without a new scan at every request, until the platform directory (not Bin) changes.
     {"unwritable VXIplug&play directory", [](IInstrSessionMgr* manager) {
-         const std::string folder = root + "\\Win64\\drivers", driver = folder + "\\standard.dll";
-         ::CreateDirectoryA(folder.c_str(), nullptr);
-         ::CopyFileA(SCAN_STANDARD, driver.c_str(), FALSE);
+         const std::string driver = bin + "\\scan_standard.dll";  // copied there with the drivers
          ::DeleteFileA(configurationPath.c_str());
          ::CreateDirectoryA(configurationPath.c_str(), nullptr);
          auto drivers = [manager] {
@@ -207,7 +207,6 @@ const Row rows[] = {
          ::RemoveDirectoryA(configurationPath.c_str());
          EXPECT_EQ(drivers(), scanned - 1);
          EXPECT_NE(ReadFileBytes(configurationPath).find("[VPPVInstr->"), std::string::npos);
-         ::RemoveDirectoryA(folder.c_str());
          return Answer{};
      }, {}, false, true},
 };
