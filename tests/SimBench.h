@@ -51,15 +51,16 @@ inline std::string SystemFile(const char* name) {
     return std::string(folder) + "\\" + name;
 }
 
-// A library the installation put in the system directory, moved away until Restore or the end.
+// A library the installation put in the system directory, moved away until the end of the scope.
 class LibraryHidden {
 public:
-    explicit LibraryHidden(const char* name) : path(SystemFile(name)) { Hide(); }
-    ~LibraryHidden() { Restore(); }
-    void Hide() { hidden = hidden || ::MoveFileA(path.c_str(), (path + ".hidden").c_str()); }
-    void Restore() { hidden = hidden && !::MoveFileA((path + ".hidden").c_str(), path.c_str()); }
+    explicit LibraryHidden(const char* name)
+        : path(SystemFile(name)), hidden(::MoveFileA(path.c_str(), (path + ".hidden").c_str())) {}
+    ~LibraryHidden() {
+        if (hidden) ::MoveFileA((path + ".hidden").c_str(), path.c_str());
+    }
     const std::string path;
-    bool hidden = false;
+    const bool hidden;
 };
 
 // The switch engine unregistered by its own DllUnregisterServer, and registered again at the end.

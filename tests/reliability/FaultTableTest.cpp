@@ -19,7 +19,6 @@ constexpr const char* vxipnpKey = "SOFTWARE\\VXIPNP_Alliance\\VXIPNP\\CurrentVer
 const std::string root = TempPath("SessionMgrFaultTable"), bin = root + "\\Win64\\Bin",
                   configurationPath = root + "\\Win64\\QVSessionMgr.ini";
 
-
 std::string Instrument(const char* name, const char* prefix, const char* resource) {
     return std::string("[VPPVInstr->") + name + "]\nModulePath = " + bin + "\\" + prefix + "_64.dll\nPrefix = " + prefix +
            "\nResource = " + resource + "\nIDQuery = False\nReset = False\n";
@@ -59,7 +58,7 @@ const bool benchReady = [] {
     return true;
 }();
 
-// The file's bytes and write time.
+// The file's bytes and write time (its low part: any two writes of a test differ there).
 std::string ConfigurationFile() {
     WIN32_FILE_ATTRIBUTE_DATA data{};
     ::GetFileAttributesExA(configurationPath.c_str(), GetFileExInfoStandard, &data);

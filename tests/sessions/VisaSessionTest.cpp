@@ -13,7 +13,7 @@ const ::testing::Environment* const apartment = ::testing::AddGlobalTestEnvironm
 
 const bool benchReady = [] {
     UseConfigurationFile("SessionMgrVisaSession", "[VISA Logical Names]\nDMM = GPIB0::14::INSTR\n");
-    UseSimSetup("visasession", "[VISA GPIB0::14::INSTR]\n[VISA ASRL9::INSTR]\n");
+    UseSimSetup("visasession", "[VISA GPIB0::14::INSTR]\n");
     return true;
 }();
 
@@ -56,10 +56,10 @@ TEST_F(VisaSession, CloseClosesTheInstrumentThenItsResourceManager) {
 
 // Catches a handle handed out of its process.
 TEST_F(VisaSession, HandlesAreRefusedOutsideTheirProcess) {
-    auto missing = GetSession(manager.Get(), L"VISA::ASRL9::INSTR");
+    auto session = GetSession(manager.Get(), L"VISA::GPIB0::14::INSTR");
     UniqueVariant handle;
-    ASSERT_EQ(missing->put_InExternalProcess(VARIANT_TRUE), S_OK);
-    EXPECT_EQ(AnswerOf(missing->GetHandleEx(IODriver, handle.Get())),
+    ASSERT_EQ(session->put_InExternalProcess(VARIANT_TRUE), S_OK);
+    EXPECT_EQ(AnswerOf(session->GetHandleEx(IODriver, handle.Get())),
               Answer(operationFailed, "VISA instrument handles cannot be used outside of the operating system process "
                                       "that they are created in."));
 }
